@@ -1,0 +1,35 @@
+#include <cstring>
+
+#include "core/status.h"
+#include "platform/file_runtime.h"
+#include "platform/heap.h"
+#include "storage/raw_file.h"
+
+namespace tessarine::storage {
+namespace {
+
+constexpr char kScratchDirectory[] = "c:\\tmp";
+constexpr char kScratchPrefix[] = "KLOD";
+// Binary, read and write, create; exclusive so that a scratch name is never
+// shared with a file someone else made in the meantime.
+constexpr int32_t kScratchFlags =
+    platform::kO_BINARY | platform::kO_CREAT | platform::kO_RDWR | platform::kO_EXCL;
+constexpr int32_t kOwnerReadWrite = platform::kS_IREAD | platform::kS_IWRITE;
+
+}  // namespace
+
+int16_t FM_CreateScratchFile(char *path, int32_t *fd) {
+    char *name = platform::_tempnam(kScratchDirectory, kScratchPrefix);
+    if (name == nullptr) return kErrFileAccess;
+    FM_CopyPath(name, path);
+    *fd = platform::_open(path, kScratchFlags, kOwnerReadWrite);
+    platform::GlobalFree(name);
+    return *fd < 1 ? kErrFileAccess : kOk;
+}
+
+void FM_CopyPath(const char *source, char *destination) {
+    while ((*destination++ = *source++) != '\0') {
+    }
+}
+
+}  // namespace tessarine::storage
