@@ -4,12 +4,16 @@
 
 #include <tessarine/tessarine.h>
 
+#include "demo.h"
+
 namespace {
 
 int32_t PrintMessage(const char *text, uint32_t style, int32_t id) {
     std::printf("  message box (id %d, style 0x%X): \"%s\"\n", id, style, text);
     return 1;
 }
+
+}  // namespace
 
 void DemoStatuses() {
     std::puts("Statuses and their messages:");
@@ -52,7 +56,6 @@ void DemoRawFile() {
     FM_Delete(path);
 }
 
-}  // namespace
 
 int main() {
     std::puts("Tessarine demo");

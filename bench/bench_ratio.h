@@ -1,0 +1,75 @@
+// Benchmark main that prints, after the runs, the throughput ratio of each
+// measured benchmark against a baseline measured in the same run:
+// baseline time / measured time, so 1.0 means as fast as the baseline.
+#pragma once
+
+#include <benchmark/benchmark.h>
+
+#include <cstdio>
+#include <map>
+#include <string>
+#include <vector>
+
+namespace tsbench {
+
+struct RatioPair {
+    std::string measured;
+    std::string baseline;
+    double target;  // printed beside the ratio; 0 for none
+};
+
+inline std::vector<RatioPair> &Pairs() {
+    static std::vector<RatioPair> pairs;
+    return pairs;
+}
+
+// Names are full benchmark names as printed, with their arguments
+// (e.g. "BM_MemCopy/1048576").
+inline void AddRatio(const std::string &measured, const std::string &baseline,
+                     double target = 0) {
+    Pairs().push_back({measured, baseline, target});
+}
+
+class CapturingReporter : public benchmark::ConsoleReporter {
+  public:
+    void ReportRuns(const std::vector<Run> &runs) override {
+        for (const Run &run : runs) {
+            if (run.run_type == Run::RT_Iteration || run.aggregate_name == "mean")
+                times_[run.run_name.str()] = run.GetAdjustedRealTime();
+        }
+        ConsoleReporter::ReportRuns(runs);
+    }
+    void PrintRatios() const {
+        for (const RatioPair &p : Pairs()) {
+            auto m = times_.find(p.measured);
+            auto b = times_.find(p.baseline);
+            if (m == times_.end() || b == times_.end() || m->second <= 0) continue;
+            const double ratio = b->second / m->second;
+            if (p.target > 0)
+                std::printf("ratio %s vs %s: %.3f (target %.2f: %s)\n", p.measured.c_str(),
+                            p.baseline.c_str(), ratio, p.target,
+                            ratio >= p.target ? "met" : "NOT met");
+            else
+                std::printf("ratio %s vs %s: %.3f\n", p.measured.c_str(), p.baseline.c_str(),
+                            ratio);
+        }
+    }
+
+  private:
+    std::map<std::string, double> times_;
+};
+
+inline int Main(int argc, char **argv) {
+    benchmark::Initialize(&argc, argv);
+    if (benchmark::ReportUnrecognizedArguments(argc, argv)) return 1;
+    CapturingReporter reporter;
+    benchmark::RunSpecifiedBenchmarks(&reporter);
+    reporter.PrintRatios();
+    benchmark::Shutdown();
+    return 0;
+}
+
+}  // namespace tsbench
+
+#define TSBENCH_MAIN() \
+    int main(int argc, char **argv) { return tsbench::Main(argc, argv); }

@@ -1,0 +1,6 @@
+// Each part of the demo shows one service and prints what it did.
+#pragma once
+
+void DemoStatuses();
+void DemoMemory();
+void DemoRawFile();
