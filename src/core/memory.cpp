@@ -38,7 +38,9 @@ void ForwardCopy(const unsigned char *source, unsigned char *destination, size_t
 void CopyBytes(const void *source, void *destination, size_t count) {
     const auto *s = static_cast<const unsigned char *>(source);
     auto *d = static_cast<unsigned char *>(destination);
-    const bool overlaps = d < s + count && s < d + count;
+    const uintptr_t from = reinterpret_cast<uintptr_t>(s);
+    const uintptr_t to = reinterpret_cast<uintptr_t>(d);
+    const bool overlaps = to < from + count && from < to + count;
     if (overlaps)
         ForwardCopy(s, d, count);
     else
