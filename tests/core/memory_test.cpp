@@ -271,9 +271,9 @@ void ReferenceForwardCopy(const uint8_t *s, uint8_t *d, int32_t count) {
 }
 
 TEST_F(Memory, CopyToAHigherDestinationInTheSameBlockSmears) {
-    for (int32_t shift : {1, 2, 3, 4, 5, 8}) {
-        for (int32_t count : {3, 4, 7, 16, 33}) {
-            std::vector<uint8_t> block(64), expected(64);
+    for (int32_t shift : {1, 2, 3, 4, 5, 6, 7, 8, 12, 13, 40, 99}) {
+        for (int32_t count : {1, 3, 4, 7, 16, 33, 100, 150}) {
+            std::vector<uint8_t> block(256), expected(256);
             for (size_t i = 0; i < block.size(); ++i) block[i] = expected[i] = static_cast<uint8_t>(i);
             MEM_Copy(block.data(), block.data() + shift, count);
             ReferenceForwardCopy(expected.data(), expected.data() + shift, count);
