@@ -93,7 +93,8 @@ void Register() {
         benchmark::RegisterBenchmark("BM_MemCopy", BM_MemCopy)->Arg(size);
         benchmark::RegisterBenchmark("BM_memset", BM_memset)->Arg(size);
         benchmark::RegisterBenchmark("BM_MemFill", BM_MemFill)->Arg(size);
-        const std::string arg = "/" + std::to_string(size);
+        std::string arg = std::to_string(size);
+        arg.insert(arg.begin(), '/');
         const double target = size == (1 << 20) ? 0.8 : 0;
         tsbench::AddRatio("BM_MemCopy" + arg, "BM_memcpy" + arg, target);
         tsbench::AddRatio("BM_MemFill" + arg, "BM_memset" + arg, target);

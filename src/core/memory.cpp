@@ -29,9 +29,13 @@ uint32_t PointerFlags(uint32_t flags) {
 // runs: with the destination `gap` bytes above the source, a run of up to
 // gap bytes reads nothing that the same run writes.
 void ForwardCopy(const unsigned char *source, unsigned char *destination, size_t count) {
-    const size_t words = count & ~size_t{3};
     const uintptr_t from = reinterpret_cast<uintptr_t>(source);
     const uintptr_t to = reinterpret_cast<uintptr_t>(destination);
+    if (to >= from + count || from >= to + count) {
+        std::memcpy(destination, source, count);
+        return;
+    }
+    const size_t words = count & ~size_t{3};
     if (to <= from || to - from >= words) {
         // Below the source a forward copy never reads what it wrote.
         std::memmove(destination, source, words);
