@@ -63,8 +63,9 @@ TESSARINE_API int32_t MGR_SMemAlloc(MGR_SMem *arena, int32_t size, void **piece)
     }
     if (size > arena->largeThreshold) return OwnBlock(arena, size, piece);
     // Abandon the tail of the current block.
-    arena->wasted = static_cast<int32_t>(static_cast<uint32_t>(arena->wasted) +
-                                         static_cast<uint32_t>(arena->blockSize - arena->usedInCurrent));
+    arena->wasted =
+        static_cast<int32_t>(static_cast<uint32_t>(arena->wasted) +
+                             static_cast<uint32_t>(arena->blockSize - arena->usedInCurrent));
     const int32_t status = NewCurrent(arena);
     if (status < 0) return status;
     *piece = arena->current;
@@ -73,7 +74,9 @@ TESSARINE_API int32_t MGR_SMemAlloc(MGR_SMem *arena, int32_t size, void **piece)
 }
 
 // The other fields keep their values: the arena must be initialised again.
-TESSARINE_API void MGR_SMemEnd(MGR_SMem *arena) { tessarine::detail::FreePoolBlocks(&arena->blocks); }
+TESSARINE_API void MGR_SMemEnd(MGR_SMem *arena) {
+    tessarine::detail::FreePoolBlocks(&arena->blocks);
+}
 
 TESSARINE_API void MGR_SMemReport(MGR_SMem *arena) {
     [[maybe_unused]] int64_t bytes = 0;

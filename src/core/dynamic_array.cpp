@@ -71,8 +71,7 @@ TESSARINE_API int32_t MGR_DARYStart(MGR_DARY *array, int32_t elementSize, int32_
 // The growth comes two elements before the block is full.
 TESSARINE_API int32_t MGR_DARYAlloc(MGR_DARY *array, void **element) {
     if (array->used >= static_cast<int64_t>(array->capacity) - 2) {
-        const int32_t status =
-            Resize(array, static_cast<int64_t>(array->capacity) + array->growBy);
+        const int32_t status = Resize(array, static_cast<int64_t>(array->capacity) + array->growBy);
         if (status < 0) return status;
     }
     *element = static_cast<uint8_t *>(array->base) +

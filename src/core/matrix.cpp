@@ -59,10 +59,9 @@ TESSARINE_API void QM_ApplyQmIntXY(const QM *m, int32_t x, int32_t y, int32_t *o
 // The bounding rectangle of the four transformed corners, exclusive edges
 // taken as they stand.
 TESSARINE_API void QM_ApplyQmRECT(const QM *m, RECT *rect) {
-    const IntPoint corners[4] = {ApplyInt(*m, rect->left, rect->top),
-                                 ApplyInt(*m, rect->left, rect->bottom),
-                                 ApplyInt(*m, rect->right, rect->top),
-                                 ApplyInt(*m, rect->right, rect->bottom)};
+    const IntPoint corners[4] = {
+        ApplyInt(*m, rect->left, rect->top), ApplyInt(*m, rect->left, rect->bottom),
+        ApplyInt(*m, rect->right, rect->top), ApplyInt(*m, rect->right, rect->bottom)};
     RECT r{corners[0].x, corners[0].y, corners[0].x, corners[0].y};
     for (const IntPoint &p : corners) {
         r.left = std::min(r.left, p.x);

@@ -70,7 +70,9 @@ TESSARINE_API int32_t MGR_ListResetOneBlock(MGR_List *pool) {
 }
 
 // The other fields keep their values: the pool must be initialised again.
-TESSARINE_API void MGR_ListEnd(MGR_List *pool) { tessarine::detail::FreePoolBlocks(&pool->blocks); }
+TESSARINE_API void MGR_ListEnd(MGR_List *pool) {
+    tessarine::detail::FreePoolBlocks(&pool->blocks);
+}
 
 TESSARINE_API void MGR_ListReport(MGR_List *pool) {
     [[maybe_unused]] const int32_t blocks = ListNumber(pool->blocks);

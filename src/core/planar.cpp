@@ -21,9 +21,8 @@ TESSARINE_API int32_t EqualPoints(double x1, double y1, double x2, double y2) {
 TESSARINE_API int32_t ExtentIntExtent(double minX1, double minY1, double maxX1, double maxY1,
                                       double minX2, double minY2, double maxX2, double maxY2) {
     const double e = kExtentSlack;
-    return minX2 <= maxX1 + e && minX1 <= maxX2 + e && minY2 <= maxY1 + e && minY1 <= maxY2 + e
-               ? 1
-               : 0;
+    return minX2 <= maxX1 + e && minX1 <= maxX2 + e && minY2 <= maxY1 + e && minY1 <= maxY2 + e ? 1
+                                                                                                : 0;
 }
 
 // 0 when an intersection was computed, 1 for parallel lines (outputs untouched).

@@ -5,8 +5,12 @@
 
 extern "C" {
 
-TESSARINE_API int32_t ShortRound(double x) { return tessarine::detail::ShortRoundRule(x); }
+TESSARINE_API int32_t ShortRound(double x) {
+    return tessarine::detail::ShortRoundRule(x);
+}
 
-TESSARINE_API int32_t LongRound(double x) { return tessarine::detail::LongRoundRule(x); }
+TESSARINE_API int32_t LongRound(double x) {
+    return tessarine::detail::LongRoundRule(x);
+}
 
 }  // extern "C"

@@ -148,8 +148,12 @@ int32_t AlwaysZero(ListNode *, ListNode *) {
     ++g_compareCalls;
     return 0;
 }
-int32_t HighBitsOnly(ListNode *, ListNode *) { return 0x10000; }
-int32_t NegativeInLowHalf(ListNode *, ListNode *) { return 0x7FFF8000; }
+int32_t HighBitsOnly(ListNode *, ListNode *) {
+    return 0x10000;
+}
+int32_t NegativeInLowHalf(ListNode *, ListNode *) {
+    return 0x7FFF8000;
+}
 
 TEST_P(Sizes, InsertSortKeepsAscendingAndStable) {
     const int n = GetParam();
@@ -427,9 +431,9 @@ TEST_P(HeapLists, FreeEntireListFreesEveryNode) {
 int32_t g_releaseCalls = 0;
 std::vector<bool> g_releaseSawNull;
 int32_t g_copyCalls = 0;
-int32_t g_failAtCopy = -1;     // copy call (0-based) that fails
+int32_t g_failAtCopy = -1;  // copy call (0-based) that fails
 int32_t g_failStatus = -5;
-int32_t g_skipCopy = -1;       // copy call that leaves null
+int32_t g_skipCopy = -1;  // copy call that leaves null
 
 int32_t CopyItem(ListNode *source, ListNode **copy) {
     const int32_t call = g_copyCalls++;

@@ -250,8 +250,10 @@ TEST_F(Memory, CopyOfZeroOrNegativeCountCopiesNothing) {
 
 TEST_F(Memory, CopySourceFirst) {
     for (int32_t count : {1, 2, 3, 4, 5, 6, 7, 8, 13, 4096, 100003}) {
-        std::vector<uint8_t> from(static_cast<size_t>(count)), to(static_cast<size_t>(count) + 4, 0xEE);
-        for (int32_t i = 0; i < count; ++i) from[static_cast<size_t>(i)] = static_cast<uint8_t>(i * 7 + 1);
+        std::vector<uint8_t> from(static_cast<size_t>(count)),
+            to(static_cast<size_t>(count) + 4, 0xEE);
+        for (int32_t i = 0; i < count; ++i)
+            from[static_cast<size_t>(i)] = static_cast<uint8_t>(i * 7 + 1);
         MEM_Copy(from.data(), to.data(), count);
         EXPECT_EQ(std::memcmp(from.data(), to.data(), static_cast<size_t>(count)), 0) << count;
         EXPECT_TRUE(AllBytes(to.data() + count, 4, 0xEE));
@@ -274,7 +276,8 @@ TEST_F(Memory, CopyToAHigherDestinationInTheSameBlockSmears) {
     for (int32_t shift : {1, 2, 3, 4, 5, 6, 7, 8, 12, 13, 40, 99}) {
         for (int32_t count : {1, 3, 4, 7, 16, 33, 100, 150}) {
             std::vector<uint8_t> block(256), expected(256);
-            for (size_t i = 0; i < block.size(); ++i) block[i] = expected[i] = static_cast<uint8_t>(i);
+            for (size_t i = 0; i < block.size(); ++i)
+                block[i] = expected[i] = static_cast<uint8_t>(i);
             MEM_Copy(block.data(), block.data() + shift, count);
             ReferenceForwardCopy(expected.data(), expected.data() + shift, count);
             EXPECT_EQ(block, expected) << "shift " << shift << " count " << count;

@@ -111,6 +111,22 @@ TEST_F(DynamicArray, StartWithNothingToLockGivesMinusOne) {
     EXPECT_EQ(LiveBlocks(), live);
 }
 
+TEST_F(DynamicArray, ResizeToNothingLockableGivesMinusOne) {
+    MGR_DARY a;
+    MGR_DARYInit(&a);
+    ASSERT_EQ(MGR_DARYStart(&a, 4, 10), 10);
+    a.elementSize = 0;  // the resize asks for 0 bytes: the block is discarded
+    EXPECT_EQ(MGR_DARYResize(&a, 20), -1);
+    EXPECT_NE(a.handle, nullptr);  // the handle stays, for MGR_DARYEnd
+    EXPECT_EQ(a.base, nullptr);
+    EXPECT_EQ(a.capacity, 20);
+    void *element = kUntouched;
+    a.used = 18;
+    EXPECT_EQ(MGR_DARYAlloc(&a, &element), -1);
+    EXPECT_EQ(element, kUntouched);
+    MGR_DARYEnd(&a);
+}
+
 TEST_F(DynamicArray, OverflowingByteCountFailsWithoutAllocating) {
     MGR_DARY a;
     MGR_DARYInit(&a);
@@ -232,7 +248,8 @@ TEST_F(NodePool, CarvesBlocksOfPerBlockNodes) {
     for (int i = 0; i < 7; ++i) ASSERT_EQ(MGR_ListAlloc(&pool, &nodes[i]), 10);
     EXPECT_EQ(ListNumber(pool.blocks), 3);
     EXPECT_EQ(static_cast<uint8_t *>(nodes[1]), static_cast<uint8_t *>(nodes[0]) + sizeof(Record));
-    EXPECT_EQ(static_cast<uint8_t *>(nodes[2]), static_cast<uint8_t *>(nodes[0]) + 2 * sizeof(Record));
+    EXPECT_EQ(static_cast<uint8_t *>(nodes[2]),
+              static_cast<uint8_t *>(nodes[0]) + 2 * sizeof(Record));
     EXPECT_EQ(reinterpret_cast<uint8_t *>(pool.blocks->data), nodes[0]);
     EXPECT_EQ(reinterpret_cast<uint8_t *>(pool.blocks->next->data), nodes[3]);
     EXPECT_EQ(pool.current, nodes[6]);
@@ -534,9 +551,17 @@ void ArenaFailureAt(int32_t blockSize, int32_t threshold, int32_t first, int32_t
     });
 }
 
-TEST_F(Arena, AllocationFailureOnFirstBlock) { ArenaFailureAt(100, 0, 0, 10, 100); }
-TEST_F(Arena, AllocationFailureOnOwnBlock) { ArenaFailureAt(100, 0, 0, 150, 150); }
-TEST_F(Arena, AllocationFailureOnLargePiece) { ArenaFailureAt(1000, 600, 500, 700, 700); }
-TEST_F(Arena, AllocationFailureOnReplacementBlock) { ArenaFailureAt(100, 0, 70, 40, 100); }
+TEST_F(Arena, AllocationFailureOnFirstBlock) {
+    ArenaFailureAt(100, 0, 0, 10, 100);
+}
+TEST_F(Arena, AllocationFailureOnOwnBlock) {
+    ArenaFailureAt(100, 0, 0, 150, 150);
+}
+TEST_F(Arena, AllocationFailureOnLargePiece) {
+    ArenaFailureAt(1000, 600, 500, 700, 700);
+}
+TEST_F(Arena, AllocationFailureOnReplacementBlock) {
+    ArenaFailureAt(100, 0, 70, 40, 100);
+}
 
 }  // namespace

@@ -76,7 +76,8 @@ void ExpectShows(tstest::MessageCapture &capture, int32_t argument, int32_t id) 
 
 TEST(ShowStatusMsg, EveryStatusFromMinus60To12) {
     tstest::MessageCapture capture;
-    for (int32_t status = -60; status <= 12; ++status) ExpectShows(capture, status, ExpectedId(status));
+    for (int32_t status = -60; status <= 12; ++status)
+        ExpectShows(capture, status, ExpectedId(status));
 }
 
 TEST(ShowStatusMsg, PositiveStatusesShowNothing) {
@@ -91,7 +92,8 @@ TEST(ShowStatusMsg, ZeroShowsGeneralText) {
 
 TEST(ShowStatusMsg, UnlistedCodesShowGeneralText) {
     tstest::MessageCapture capture;
-    for (int32_t status : {-1, -3, -57, -4, -6, -14, -29, -40, -32768}) ExpectShows(capture, status, 16384);
+    for (int32_t status : {-1, -3, -57, -4, -6, -14, -29, -40, -32768})
+        ExpectShows(capture, status, 16384);
 }
 
 TEST(ShowStatusMsg, SilentCodes) {
@@ -110,7 +112,7 @@ TEST(ShowStatusMsg, OnlyTheLowSixteenBitsCount) {
     ExpectShows(capture, static_cast<int32_t>(0xFFFFFFFBu), 16386);
     ExpectShows(capture, 0xFFFB, 16386);
     ExpectShows(capture, 0x1234FFFB, 16386);
-    ExpectShows(capture, 0x0001000A, 0);   // 10 with garbage above
+    ExpectShows(capture, 0x0001000A, 0);      // 10 with garbage above
     ExpectShows(capture, 0x00010000, 16384);  // status 0
     ExpectShows(capture, static_cast<int32_t>(0xFFFF0005u), 0);
     ExpectShows(capture, 0xFFEE, 0);  // -18
@@ -180,8 +182,12 @@ TEST(NoOps, ReturnNothingOrOneAndShowNothing) {
 TEST(NoOps, EachFamilyIsOneFunction) {
     using Void = void (*)(...);
     using One = int32_t (*)(...);
-    Void volatile voids[] = {TOPrintf, TO_SetProgressBarLeftLabel, TO_SetProgressBarRightLabel,
-                             TO_SetProgressBarStatus, func_exit_routine, MEM_MoveHHiHdl};
+    Void volatile voids[] = {TOPrintf,
+                             TO_SetProgressBarLeftLabel,
+                             TO_SetProgressBarRightLabel,
+                             TO_SetProgressBarStatus,
+                             func_exit_routine,
+                             MEM_MoveHHiHdl};
     One volatile ones[] = {TO_CutStatusIdle, TO_InitProgressBar, TO_ReleaseProgressBar,
                            TO_SetProgressBarValue};
     Void volatile firstVoid = TO_AnimateWaitCursor;

@@ -96,7 +96,9 @@ TEST(SwapRegistryFresh, BeforeAnyRegistryEverythingButRegisterIsMinusOne) {
     InFreshProcess(BeforeAnyRegistry);
 }
 
-TEST(SwapRegistryFresh, InitAllocationFailure) { InFreshProcess(InitFailsWithMinusFive); }
+TEST(SwapRegistryFresh, InitAllocationFailure) {
+    InFreshProcess(InitFailsWithMinusFive);
+}
 
 TEST(SwapRegistryFresh, RegisterAllocationFailureAtEachAllocation) {
     InFreshProcess(RegisterMakesTheRegistry);
@@ -141,7 +143,9 @@ class SwapRegistry : public tstest::Sandbox {
     std::vector<uintptr_t> registered_;
 };
 
-TEST_F(SwapRegistry, EmptyRegistrySqueezesToTen) { EXPECT_EQ(MEM_SqueezMemory(123), 10); }
+TEST_F(SwapRegistry, EmptyRegistrySqueezesToTen) {
+    EXPECT_EQ(MEM_SqueezMemory(123), 10);
+}
 
 TEST_F(SwapRegistry, InitWhenPresentIsTen) {
     const int64_t live = tessarine::testing::LiveBlocks();
@@ -161,7 +165,8 @@ TEST_F(SwapRegistry, SqueezeWalksInRegistrationOrderAndReturnsLastResult) {
     Register(0x23);
     g_calls.clear();
     EXPECT_EQ(MEM_SqueezMemory(-9), 10 + 0x23);
-    const std::vector<std::pair<uintptr_t, int32_t>> expected = {{0x31, -9}, {0x12, -9}, {0x23, -9}};
+    const std::vector<std::pair<uintptr_t, int32_t>> expected = {
+        {0x31, -9}, {0x12, -9}, {0x23, -9}};
     EXPECT_EQ(g_calls, expected);
 }
 
@@ -278,9 +283,8 @@ TEST_F(SwapRegistry, RegisterAllocationFailure) {
 }
 
 TEST_F(SwapRegistry, InitAllocationFailureWhenPresentIsNone) {
-    const int64_t n = tstest::ForEachAllocationFailure([](int64_t) {
-        EXPECT_EQ(MEM_InitMemManager(), 10);
-    });
+    const int64_t n =
+        tstest::ForEachAllocationFailure([](int64_t) { EXPECT_EQ(MEM_InitMemManager(), 10); });
     EXPECT_EQ(n, 0);
 }
 
