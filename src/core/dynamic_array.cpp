@@ -74,6 +74,8 @@ TESSARINE_API int32_t MGR_DARYAlloc(MGR_DARY *array, void **element) {
         const int32_t status = Resize(array, static_cast<int64_t>(array->capacity) + array->growBy);
         if (status < 0) return status;
     }
+    // After a failed resize there is no block to hand out from.
+    if (array->base == nullptr) return kErrGeneral;
     *element = static_cast<uint8_t *>(array->base) +
                static_cast<int64_t>(array->elementSize) * array->used;
     ++array->used;

@@ -127,6 +127,19 @@ TEST_F(DynamicArray, ResizeToNothingLockableGivesMinusOne) {
     MGR_DARYEnd(&a);
 }
 
+TEST_F(DynamicArray, AllocAfterAFailedResizeIsRefused) {
+    MGR_DARY a;
+    MGR_DARYInit(&a);
+    ASSERT_EQ(MGR_DARYStart(&a, 4, 10), 10);
+    tessarine::testing::FailAllocationsFrom(1);
+    EXPECT_EQ(MGR_DARYResize(&a, 100), -5);
+    tessarine::testing::ResetInjection();
+    void *element = kUntouched;
+    EXPECT_EQ(MGR_DARYAlloc(&a, &element), -1);
+    EXPECT_EQ(element, kUntouched);
+    MGR_DARYEnd(&a);
+}
+
 TEST_F(DynamicArray, OverflowingByteCountFailsWithoutAllocating) {
     MGR_DARY a;
     MGR_DARYInit(&a);
