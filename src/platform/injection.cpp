@@ -11,6 +11,7 @@ struct Counter {
     std::atomic<int64_t> calls{0};
     std::atomic<int64_t> failAt{0};
     std::atomic<bool> hit{false};
+    std::atomic<bool> sticky{false};  // every call from failAt on fails
 };
 
 Counter g_counters[kSlots];
@@ -24,9 +25,10 @@ Slot SlotOf(testing::FileCall kind) {
     return kRead;
 }
 
-void Arm(Slot slot, int64_t n) {
+void Arm(Slot slot, int64_t n, bool sticky = false) {
     g_counters[slot].calls = 0;
     g_counters[slot].hit = false;
+    g_counters[slot].sticky = sticky;
     g_counters[slot].failAt = n;
 }
 
@@ -35,7 +37,7 @@ void Arm(Slot slot, int64_t n) {
 bool ShouldFail(Slot slot) {
     Counter &c = g_counters[slot];
     const int64_t n = ++c.calls;
-    if (c.failAt != 0 && n == c.failAt) {
+    if (c.failAt != 0 && (n == c.failAt || (c.sticky && n > c.failAt))) {
         c.hit = true;
         return true;
     }
@@ -49,6 +51,9 @@ namespace tessarine::testing {
 using platform::injection::g_counters;
 
 void FailAllocationAt(int64_t n) { platform::injection::Arm(platform::injection::kAlloc, n); }
+void FailAllocationsFrom(int64_t n) {
+    platform::injection::Arm(platform::injection::kAlloc, n, true);
+}
 int64_t AllocationCount() { return g_counters[platform::injection::kAlloc].calls; }
 bool AllocationFailureHit() { return g_counters[platform::injection::kAlloc].hit; }
 

@@ -8,6 +8,9 @@ namespace tessarine::testing {
 
 // Make the Nth allocation from now fail (1 = the next one); 0 turns it off.
 void FailAllocationAt(int64_t n);
+// Make the Nth allocation from now and every later one fail, for paths that
+// only fail when a fall-back allocation fails as well; 0 turns it off.
+void FailAllocationsFrom(int64_t n);
 // Allocations attempted since the last FailAllocationAt or ResetCounters.
 int64_t AllocationCount();
 // True once the injected failure has been delivered.

@@ -12,6 +12,13 @@ int main(void) {
     if (!TS_FAILED(0xFFFB)) return 3;
     TO_AnimateWaitCursor();
     if (TO_InitProgressBar(1, 2, 3) != 1) return 4;
+    {
+        RECT a, b, both;
+        IM_SetRECT(0, 0, 10, 10, &a);
+        IM_SetRECT(5, 5, 20, 20, &b);
+        if (IM_FindRECTInt(&a, &b, &both) != 1 || both.left != 5 || both.right != 10) return 5;
+    }
+    if (LongRound(2.5) != 3 || BZ_Distptpts(0, 0, 3, 4) != 25.0) return 6;
     puts("C client ok");
     return 0;
 }
