@@ -183,6 +183,21 @@ TEST(GeometryArcArea, ClockwiseAndWrapping) {
     EXPECT_EQ(Area(6.0, 6.5, 7.0, 1.0), 5);
 }
 
+TEST(GeometryArcArea, LongArcFarSide) {
+    // A clockwise arc of 343 degrees from 5.838 to -0.152 leaves a gap of 17
+    // degrees, with the three marks in it. From a tested angle whose
+    // differences to the marks all have one sign the rule picks two
+    // neighbouring marks of the cluster, not the span: 2.49 and 4.0 lie on
+    // the span and give 5 and 3. Kept as the rule gives it.
+    const double s = 5.83815474249921, w = -5.9901575688634603;
+    EXPECT_EQ(Area(s, s + 0.5 * w, s + w, 2.49), 5);
+    EXPECT_EQ(Area(s, s + 0.5 * w, s + w, 4.0), 3);
+    // Where the differences change sign the answer is the geometric one.
+    EXPECT_EQ(Area(s, s + 0.5 * w, s + w, 2.858), 4);  // opposite the gap
+    EXPECT_EQ(Area(s, s + 0.5 * w, s + w, 5.9), 3);    // in the gap, start side
+    EXPECT_EQ(Area(s, s + 0.5 * w, s + w, 6.1), 5);    // in the gap, end side
+}
+
 TEST(GeometryArcParam, Paths) {
     EXPECT_EQ(Param(0, 1e-9, 2.0), 0.0);  // no sweep
     EXPECT_EQ(Param(0, -1e-8, 2.0), 0.0);
