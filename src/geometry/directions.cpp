@@ -7,6 +7,12 @@
 using tessarine::geometry::kFullTurn;
 using tessarine::geometry::kPi;
 
+namespace {
+
+constexpr double kFarTurns = 1e6 * kFullTurn;
+
+}  // namespace
+
 extern "C" {
 
 TESSARINE_API double BZccwdir(double a) { return a < 0 ? a + kFullTurn : a; }
@@ -22,9 +28,9 @@ TESSARINE_API double BZodd(double a) { return -a; }
 TESSARINE_API double BZcomp(double a) { return a < 0 ? a + kFullTurn : a - kFullTurn; }
 
 TESSARINE_API double BZonerevol(double a) {
-    // A value that a full turn cannot move (not finite, or too large for a
-    // turn to change it) would keep the loops below going for ever.
-    if (!std::isfinite(a) || a - kFullTurn == a) return a;
+    // A value the loops below cannot bring home in reasonable time (not
+    // finite, or a million turns and more away) comes back unchanged.
+    if (!std::isfinite(a) || std::fabs(a) >= kFarTurns) return a;
     while (a + 1e-13 >= kFullTurn) a -= kFullTurn;
     while (a - 1e-13 <= -kFullTurn) a += kFullTurn;
     return a;

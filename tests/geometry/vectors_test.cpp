@@ -184,6 +184,12 @@ TEST(GeometryDirections, OnerevolLeavesWhatATurnCannotMove) {
     EXPECT_TRUE(std::isnan(BZonerevol(std::nan(""))));
     EXPECT_EQ(BZonerevol(1e300), 1e300);
     EXPECT_EQ(BZonerevol(-1e300), -1e300);
+    // A million turns and more: unchanged; just below, brought home.
+    EXPECT_EQ(BZonerevol(1e6 * kTurn), 1e6 * kTurn);
+    EXPECT_EQ(BZonerevol(-1e6 * kTurn - 1), -1e6 * kTurn - 1);
+    const double near = 999999.5 * kTurn;
+    EXPECT_GT(BZonerevol(near), -kTurn);
+    EXPECT_LT(BZonerevol(near), kTurn);
 }
 
 TEST(GeometryFrames, XformMatrix) {
