@@ -85,6 +85,16 @@ TEST(GeometryLineDistance, DegenerateLineMeasuresToB) {
     EXPECT_EQ(t, 1.0);
 }
 
+TEST(GeometryLineDistance, EqualEndsGiveB) {
+    double d = kSentinel, t = kSentinel;
+    BZ_Point f = SentinelPoint();
+    EXPECT_EQ(BZ_Mindistpt2ln(4, 5, 1, 1, 1, 1, &d, &t, &f), 10);
+    EXPECT_EQ(t, 1.0);
+    EXPECT_EQ(f.x, 1.0);
+    EXPECT_EQ(f.y, 1.0);
+    EXPECT_EQ(d, 5.0);
+}
+
 TEST(GeometryLineDistance, BoundedWithMargin) {
     double d = kSentinel, t = kSentinel;
     BZ_Point f = SentinelPoint();
@@ -225,6 +235,7 @@ TEST(GeometryArcArcDistance, ArcWithItselfIsClassThree) {
 TEST(GeometryArcArcDistance, OneCircleApartMeasuresNearestEnds) {
     const BZ_Arc a = MakeArc(0, 0, 1, 0, 1);
     const BZ_Arc b = MakeArc(0, 0, 1, kPi, 0.5);
+    EXPECT_EQ(BZ_ArcPairClass(&a, &b), 3);
     PairOut o = ArcArc(a, b);
     EXPECT_EQ(o.status, 10);
     EXPECT_EQ(o.d, BZ_Distptpt(a.end.x, a.end.y, b.start.x, b.start.y));

@@ -169,6 +169,35 @@ TEST(GeometryMergeLineArc, LineThenArcOnOneCircle) {
     EXPECT_EQ(m.out.mid.y, my);
 }
 
+TEST(GeometryMergeLineArc, NeitherArcNorLine) {
+    // On one circle, but the line's middle is off it by more than the
+    // tolerance, and the joint is far from the chord.
+    const BZ_Arc arc = MakeArc(0, 0, 1, kPi / 2, -1);
+    const BZ_Point a = OnCircle(0, 0, 1, kPi / 2 + 0.01);
+    const BZ_Line line = Ln(a.x, a.y, arc.start.x, arc.start.y);
+    Merge m = LnArc(&line, &arc, 1, 1e-7, true);
+    EXPECT_EQ(m.status, 10);
+    EXPECT_EQ(m.outcome, -1);
+    EXPECT_EQ(m.asLine, 0);
+    ExpectSentinelArc(m.out);
+    // Sweep above the limit and a loose tolerance: the distances pass for a
+    // line, the directions do not.
+    const BZ_Arc big = MakeArc(0, 0, 1, kPi / 2, -2.9);
+    m = LnArc(&line, &big, 1, 10.0, true);
+    EXPECT_EQ(m.status, 10);
+    EXPECT_EQ(m.outcome, -1);
+    EXPECT_EQ(m.asLine, 0);
+    ExpectSentinelArc(m.out);
+    // Coming back to the start: the chord from A to E has no length.
+    BZ_Arc back = MakeArc(0, 0, 1, kPi / 2, -(kTurn - 0.01));
+    back.end = a;
+    m = LnArc(&line, &back, 1, 100.0, true);
+    EXPECT_EQ(m.status, 10);
+    EXPECT_EQ(m.outcome, -1);
+    EXPECT_EQ(m.asLine, 0);
+    ExpectSentinelArc(m.out);
+}
+
 TEST(GeometryMergeLineArc, ArcThenLineComparesTheArcsEndTangent) {
     // The line continues the arc along its end tangent. The merged circle's
     // start tangent is compared with the arc's end tangent, which turns by
@@ -381,6 +410,76 @@ TEST(GeometryMergeArcs, OppositeCurvatureMergesOnlyToALine) {
     m = ArcArc(a, b, 1e-4, true);
     EXPECT_EQ(m.outcome, -1);
     EXPECT_EQ(m.asLine, 0);
+}
+
+TEST(GeometryMergeArcs, LineRefusedByDirection) {
+    // An S of two arcs of 0.4 rad: within a loose tolerance of the chord,
+    // but their end tangents are 0.2 rad off it.
+    const BZ_Arc a = MakeArc(0, -std::cos(0.2), 1, kPi / 2 + 0.2, -0.4);
+    BZ_Arc b = MakeArc(2 * a.end.x, std::cos(0.2), 1, -kPi / 2 - 0.2, 0.4);
+    b.start = a.end;
+    Merge m = ArcArc(a, b, 1.0, true);
+    EXPECT_EQ(m.status, 10);
+    EXPECT_EQ(m.outcome, -1);
+    EXPECT_EQ(m.asLine, 0);
+    ExpectSentinelArc(m.out);
+}
+
+TEST(GeometryMergeArcs, ClosedFirstArcFailsTheJointVector) {
+    // A full circle first: the corrected joint falls on A.
+    const BZ_Arc a = MakeArc(0, 0, 1, 0, kTurn);
+    BZ_Arc b = MakeArc(0, 0, 1, kTurn, 1);
+    b.start = a.end;
+    Merge m = ArcArc(a, b, 1e-3, true);
+    EXPECT_EQ(m.status, -3);
+    EXPECT_EQ(m.outcome, -1);
+    EXPECT_EQ(m.asLine, 0);
+    ExpectSentinelArc(m.out);
+}
+
+TEST(GeometryMergeArcs, SweepOfExactlyTheLimitIsRefused) {
+    // The model of the joint correction, to find an end whose merged sweep
+    // is exactly 2.827433388.
+    const double h = 1.4;
+    const BZ_Arc a = MakeArc(0, 0, 1, 0, h);
+    auto second = [&](double endAngle) {
+        BZ_Arc b;
+        b.centre = Pt(0, 0);
+        b.start = a.end;
+        b.startAngle = h;
+        b.sweep = endAngle - h;
+        b.mid = OnCircle(0, 0, 1, h + 0.5 * b.sweep);
+        b.end = OnCircle(0, 0, 1, endAngle);
+        return b;
+    };
+    auto mergedSweep = [&](const BZ_Arc &b) {
+        double t1x, t1y, t2x, t2y;
+        BZ_ArcEval(0, 0, 1, a.startAngle, a.sweep, 1, 1, &t1x, &t1y);
+        BZ_ArcEval(0, 0, BZ_Distptpt(0, 0, b.start.x, b.start.y), b.startAngle, b.sweep, 0, 1,
+                   &t2x, &t2y);
+        double w = BZ_Crossp(t1x, t1y, t2x, t2y);
+        if (w > 0.7) w = 0.7;
+        const BZ_Point j{(1 - w) * b.start.x + w * (a.mid.x + b.mid.x) / 2,
+                         (1 - w) * b.start.y + w * (a.mid.y + b.mid.y) / 2};
+        double sweep = 0;
+        int16_t outcome = 0;
+        BZ_3ptarcinfo(a.start.x, a.start.y, j.x, j.y, b.end.x, b.end.y, nullptr, nullptr, nullptr,
+                      &sweep, nullptr, &outcome);
+        return outcome == 10 ? sweep : 0.0;
+    };
+    bool found = false;
+    BZ_Arc b{};
+    for (int i = -4000; i <= 4000 && !found; ++i) {
+        b = second(2.827433388 + i * 1e-16);
+        found = mergedSweep(b) == 2.827433388;
+    }
+    ASSERT_TRUE(found);
+    Merge m = ArcArc(a, b, 1e-6, false);
+    EXPECT_EQ(m.status, 10);
+    EXPECT_EQ(m.outcome, -1);
+    ExpectSentinelArc(m.out);
+    m = ArcArc(a, second(2.8274), 1e-6, false);
+    EXPECT_EQ(m.outcome, 10);
 }
 
 TEST(GeometryMergeArcs, DifferentCirclesDoNotMerge) {
