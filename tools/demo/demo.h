@@ -5,3 +5,4 @@ void DemoStatuses();
 void DemoMemory();
 void DemoRawFile();
 void DemoCore();
+void DemoGeometry();

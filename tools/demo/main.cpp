@@ -63,5 +63,6 @@ int main() {
     DemoMemory();
     DemoRawFile();
     DemoCore();
+    DemoGeometry();
     return 0;
 }
