@@ -32,7 +32,12 @@ struct Merge {
     int16_t asLine = kSentinel16;
     int16_t outcome = kSentinel16;
     int32_t status = 0;
-    const BZ_Line &Line() const { return *reinterpret_cast<const BZ_Line *>(&out); }
+    // A merged line is written into the head of the out record.
+    BZ_Line Line() const {
+        BZ_Line line;
+        std::memcpy(&line, &out, sizeof line);
+        return line;
+    }
 };
 
 Merge LnArc(const void *first, const void *second, int16_t order, double tol, bool wantLine) {
