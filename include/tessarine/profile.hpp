@@ -126,7 +126,8 @@ enum XQResult : long {
                             // intent or count, or a null source/destination path
     XQ_ERR_PROFILE = -2,    // a profile is missing or cannot be read
     XQ_ERR_TRANSFORM = -3,  // the profiles do not fit the formats or each other
-    XQ_ERR_MEMORY = -4,     // memory ran out
+    XQ_ERR_MEMORY = -4,     // the library's heap ran out (the colour engine's own
+                            // memory failures show as -2 or -3)
     XQ_ERR_CANCELLED = -5,  // the progress callback asked to stop
 };
 

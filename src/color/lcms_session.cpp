@@ -1,7 +1,5 @@
 #include "color/lcms_session.h"
 
-#include <lcms2_plugin.h>
-
 #include <tessarine/storage.h>
 
 #include "core/status.h"
@@ -11,38 +9,12 @@ namespace tessarine::color {
 
 using platform::GlobalAlloc;
 using platform::GlobalFree;
-using platform::GlobalReAlloc;
 using platform::GMEM_FIXED;
-using platform::GMEM_MOVEABLE;
 
 namespace {
 
-// LittleCMS refuses blocks above this itself; a plug-in must do the same.
-constexpr cmsUInt32Number kLargestBlock = 512u * 1024u * 1024u;
 // Larger files are no profiles we would use.
 constexpr int32_t kLargestProfile = 256 * 1024 * 1024;
-
-void *HeapMalloc(cmsContext context, cmsUInt32Number size) {
-    void *block = size > kLargestBlock ? nullptr : GlobalAlloc(GMEM_FIXED, size);
-    if (block == nullptr) NoteOutOfMemory(context);
-    return block;
-}
-
-void HeapFree(cmsContext, void *block) {
-    if (block != nullptr) GlobalFree(block);
-}
-
-void *HeapRealloc(cmsContext context, void *block, cmsUInt32Number size) {
-    if (block == nullptr) return HeapMalloc(context, size);
-    void *moved = size > kLargestBlock ? nullptr
-                                       : GlobalReAlloc(block, size == 0 ? 1 : size, GMEM_MOVEABLE);
-    if (moved == nullptr) NoteOutOfMemory(context);
-    return moved;
-}
-
-cmsPluginMemHandler g_heapPlugin = {
-    {cmsPluginMagicNumber, 2000, cmsPluginMemHandlerSig, nullptr},
-    HeapMalloc, HeapFree, HeapRealloc, nullptr, nullptr, nullptr};
 
 // Errors are statuses here; nothing is logged.
 void IgnoreError(cmsContext, cmsUInt32Number, const char *) {}
@@ -73,16 +45,8 @@ class BlockGuard {
 
 }  // namespace
 
-// While the context itself is being made, LittleCMS allocates on behalf of a
-// context that is not yet registered; its user data is then not ours.
-void NoteOutOfMemory(cmsContext context) {
-    if (context == nullptr) return;
-    auto *session = static_cast<LcmsSession *>(cmsGetContextUserData(context));
-    if (session != nullptr) session->outOfMemory_ = true;
-}
-
 LcmsSession::LcmsSession() {
-    context_ = cmsCreateContext(&g_heapPlugin, this);
+    context_ = cmsCreateContext(nullptr, nullptr);
     if (context_ == nullptr) {
         outOfMemory_ = true;
         return;

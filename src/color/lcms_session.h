@@ -1,7 +1,12 @@
-// LittleCMS work on the library's heap: each operation runs in a context of
-// its own whose memory comes from the heap layer (so it is counted, can be
-// made to fail, and is all returned when the context ends), and profiles are
-// read through the raw file layer.
+// LittleCMS work: each operation runs in a context of its own (its alarm
+// colour and error handler touch no other caller), and profiles are read
+// through the raw file layer into the library's heap.
+//
+// The engine's internal memory stays on the engine's own allocator. Routed
+// through the heap layer, an injected failure inside LittleCMS 2.14's
+// pipeline optimiser leaves a half-joined pipeline behind and crashes it; on
+// its own allocator such a failure is as rare as anywhere else. A failure
+// inside the engine shows as a profile or transform failure.
 #pragma once
 
 #include <lcms2.h>
@@ -13,9 +18,6 @@
 
 namespace tessarine::color {
 
-// Marks the session of the context as out of memory.
-void NoteOutOfMemory(cmsContext context);
-
 class LcmsSession {
   public:
     LcmsSession();
@@ -25,7 +27,7 @@ class LcmsSession {
 
     cmsContext Context() const { return context_; }
     bool Valid() const { return context_ != nullptr; }
-    // True once an allocation of this session has failed.
+    // True once an allocation of ours in this session has failed.
     bool OutOfMemory() const { return outOfMemory_; }
     // The failure to report: memory when it ran out, `otherwise` if not.
     long Failure(long otherwise) const { return outOfMemory_ ? XQ_ERR_MEMORY : otherwise; }
@@ -35,7 +37,6 @@ class LcmsSession {
     cmsHPROFILE OpenProfile(char const *path);
 
   private:
-    friend void NoteOutOfMemory(cmsContext context);
     cmsContext context_ = nullptr;
     bool outOfMemory_ = false;
 };
