@@ -62,5 +62,6 @@ int main() {
     DemoStatuses();
     DemoMemory();
     DemoRawFile();
+    DemoColor();
     return 0;
 }
