@@ -65,7 +65,8 @@ void BM_FormulaSRgbToCmyk(benchmark::State &state) {
 void BM_LcmsSRgbToCmyk(benchmark::State &state) {
     Pixels &p = Data();
     for (auto _ : state) {
-        cmsDoTransform(p.toCmyk, p.rgb.data(), p.cmykOut.data(), static_cast<cmsUInt32Number>(kPixels));
+        cmsDoTransform(p.toCmyk, p.rgb.data(), p.cmykOut.data(),
+                       static_cast<cmsUInt32Number>(kPixels));
         benchmark::DoNotOptimize(p.cmykOut.data());
     }
     state.SetItemsProcessed(static_cast<int64_t>(state.iterations() * kPixels));
@@ -89,7 +90,8 @@ void BM_FormulaCmykToSRgb(benchmark::State &state) {
 void BM_LcmsCmykToSRgb(benchmark::State &state) {
     Pixels &p = Data();
     for (auto _ : state) {
-        cmsDoTransform(p.toRgb, p.cmyk.data(), p.rgbOut.data(), static_cast<cmsUInt32Number>(kPixels));
+        cmsDoTransform(p.toRgb, p.cmyk.data(), p.rgbOut.data(),
+                       static_cast<cmsUInt32Number>(kPixels));
         benchmark::DoNotOptimize(p.rgbOut.data());
     }
     state.SetItemsProcessed(static_cast<int64_t>(state.iterations() * kPixels));

@@ -47,7 +47,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     for (int16_t format : formats) {
         CX_ColorBuffer a{format, 3, in};
         CX_ColorBuffer b{CX_FORMAT_RGB, 3, out};
-        const long result = R27_XQMatchColors(&profile, &profile, nullptr, nullptr, &a, &b, 0, 1, 0);
+        const long result =
+            R27_XQMatchColors(&profile, &profile, nullptr, nullptr, &a, &b, 0, 1, 0);
         if (result > 0 || result < XQ_ERR_CANCELLED) std::abort();
     }
     std::remove(path.c_str());

@@ -6,9 +6,9 @@
 #include <stddef.h>
 #include <stdint.h>
 
+#include "core.h"
 #include "export.h"
 #include "platform.h"
-#include "core.h"
 
 TESSARINE_BEGIN_C
 

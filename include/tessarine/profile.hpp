@@ -77,11 +77,11 @@ class AFilePath {
 // and transforms fit the code, and 0 when they do not, when the profile cannot
 // be read, or for any other code.
 enum EICCProfileType : int {
-    eICCProfileRGBSource = 1,    // code 0x10001
-    eICCProfileCMYKSource = 2,   // code 0x10002
-    eICCProfileGraySource = 3,   // code 0x1000B
-    eICCProfileRGBOutput = 4,    // code 0x20001
-    eICCProfileCMYKOutput = 5,   // code 0x20002
+    eICCProfileRGBSource = 1,   // code 0x10001
+    eICCProfileCMYKSource = 2,  // code 0x10002
+    eICCProfileGraySource = 3,  // code 0x1000B
+    eICCProfileRGBOutput = 4,   // code 0x20001
+    eICCProfileCMYKOutput = 5,  // code 0x20002
 };
 
 // ---- The profile services ------------------------------------------------------
@@ -108,9 +108,9 @@ TESSARINE_API int ProfileExists(AFilePath const &folder, AString const &fileName
 // Colour matching through the provider's XQMatchColors: the four paths go as
 // text (null stays null), `input` and `output` are CX_ColorBuffer
 // descriptors, and the rest is passed on unchanged. Returns its result.
-TESSARINE_API long R27_XQMatchColors(AFilePath *source, AFilePath *destination,
-                                     AFilePath *proofing, AFilePath *abstractProfile, void *input,
-                                     void *output, int intent, unsigned long flags, long reserved);
+TESSARINE_API long R27_XQMatchColors(AFilePath *source, AFilePath *destination, AFilePath *proofing,
+                                     AFilePath *abstractProfile, void *input, void *output,
+                                     int intent, unsigned long flags, long reserved);
 
 // Gamut projection through the provider's XQProjectOntoGamut, likewise.
 TESSARINE_API long R27_XQProjectOntoGamut(AFilePath *source, AFilePath *device,
@@ -175,6 +175,8 @@ typedef bool (*XQProgressFn)(int percent, void *data);
 //   intent    as above, for rendering into the device.
 //   tolerance colour difference (CIE 1976, in hundredths) above which a colour
 //             counts as outside; 0 or less means 200.
+//   The way back out of the device is relative colorimetric, without black
+//   point compensation. Input and output may share their memory.
 struct TS_ProfileProvider {
     // Puts the description into `buffer` (at most size - 1 characters and a
     // terminator); non-zero on success.
@@ -189,8 +191,8 @@ struct TS_ProfileProvider {
                           unsigned long flags, long reserved, XQProgressFn progress,
                           void *progressData);
     long (*XQProjectOntoGamut)(char const *source, char const *device, char const *destination,
-                               void *input, void *output, void *outside, int intent,
-                               long tolerance, XQProgressFn progress, void *progressData);
+                               void *input, void *output, void *outside, int intent, long tolerance,
+                               XQProgressFn progress, void *progressData);
 };
 
 extern "C" {

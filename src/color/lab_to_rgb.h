@@ -4,7 +4,9 @@
 
 namespace tessarine::color {
 
-inline double Cube(double t) { return t * t * t; }
+inline double Cube(double t) {
+    return t * t * t;
+}
 
 // Inverse of the Lab companding around the white point's cube root.
 inline double LabInverse(double t) {
@@ -22,8 +24,7 @@ inline LinearRgb XyzFromLabToLinearRgb(double f, double a, double b, double Y) {
     double Z = 108.89 * LabInverse(fz);
     if (X < 0) X = 0;
     if (Z < 0) Z = 0;
-    return {X * 0.03241 - Y * 0.015374 - Z * 0.004986,
-            Y * 0.01876 + Z * 0.000416 - X * 0.009692,
+    return {X * 0.03241 - Y * 0.015374 - Z * 0.004986, Y * 0.01876 + Z * 0.000416 - X * 0.009692,
             X * 0.000556 - Y * 0.00204 + Z * 0.01057};
 }
 

@@ -61,11 +61,11 @@ long LcmsProjectOntoGamut(char const *source, char const *device, char const *de
     PixelLayout outLayout;
     PixelLayout markLayout;
     const int lcmsIntent = LcmsIntent(intent);
-    if (!UsableBuffer(in, &inLayout) || !UsableBuffer(out, &outLayout) ||
-        in->count != out->count || lcmsIntent < 0 || source == nullptr || device == nullptr)
+    if (!UsableBuffer(in, &inLayout) || !UsableBuffer(out, &outLayout) || in->count != out->count ||
+        lcmsIntent < 0 || source == nullptr || device == nullptr)
         return XQ_ERR_ARGUMENT;
-    if (marks != nullptr && (!UsableBuffer(marks, &markLayout) ||
-                             marks->format != CX_FORMAT_GRAY || marks->count != in->count))
+    if (marks != nullptr && (!UsableBuffer(marks, &markLayout) || marks->format != CX_FORMAT_GRAY ||
+                             marks->count != in->count))
         return XQ_ERR_ARGUMENT;
 
     LcmsSession session;
@@ -86,9 +86,9 @@ long LcmsProjectOntoGamut(char const *source, char const *device, char const *de
                                   static_cast<cmsUInt32Number>(lcmsIntent),
                                   INTENT_RELATIVE_COLORIMETRIC, INTENT_RELATIVE_COLORIMETRIC};
     cmsFloat64Number adaptation[4] = {1.0, 1.0, 1.0, 1.0};
-    TransformHandle transform(cmsCreateExtendedTransform(
-        session.Context(), 4, chain, bpc, intents, adaptation, nullptr, 0, inLayout.lcmsFormat,
-        outLayout.lcmsFormat, 0));
+    TransformHandle transform(
+        cmsCreateExtendedTransform(session.Context(), 4, chain, bpc, intents, adaptation, nullptr,
+                                   0, inLayout.lcmsFormat, outLayout.lcmsFormat, 0));
     if (!transform) return session.Failure(XQ_ERR_TRANSFORM);
 
     Marker marker;
@@ -116,10 +116,10 @@ long LcmsProjectOntoGamut(char const *source, char const *device, char const *de
                            static_cast<cmsUInt32Number>(run));
             auto *mark = static_cast<unsigned char *>(marks->pixels) + done;
             for (int32_t i = 0; i < run; ++i)
-                mark[i] = cmsDeltaE(&marker.beforeLab.Get()[i], &marker.afterLab.Get()[i]) >
-                                  marker.limit
-                              ? 1
-                              : 0;
+                mark[i] =
+                    cmsDeltaE(&marker.beforeLab.Get()[i], &marker.afterLab.Get()[i]) > marker.limit
+                        ? 1
+                        : 0;
         }
         done += run;
         if (progress != nullptr &&

@@ -26,8 +26,8 @@ long LcmsMatchColors(char const *source, char const *destination, char const *pr
     PixelLayout inLayout;
     PixelLayout outLayout;
     const int lcmsIntent = LcmsIntent(intent);
-    if (!UsableBuffer(in, &inLayout) || !UsableBuffer(out, &outLayout) ||
-        in->count != out->count || lcmsIntent < 0 || source == nullptr || destination == nullptr)
+    if (!UsableBuffer(in, &inLayout) || !UsableBuffer(out, &outLayout) || in->count != out->count ||
+        lcmsIntent < 0 || source == nullptr || destination == nullptr)
         return XQ_ERR_ARGUMENT;
     const bool proof = (flags & kProof) != 0 && proofing != nullptr;
 

@@ -31,7 +31,8 @@ int LcmsGetAsciiDescription(char const *path, int, char *buffer, unsigned long s
     LcmsSession session;
     ProfileHandle profile(session.OpenProfile(path));
     if (!profile) return 0;
-    const cmsUInt32Number limit = size > 0xFFFFFFFFul ? 0xFFFFFFFFu : static_cast<cmsUInt32Number>(size);
+    const cmsUInt32Number limit =
+        size > 0xFFFFFFFFul ? 0xFFFFFFFFu : static_cast<cmsUInt32Number>(size);
     buffer[0] = '\0';
     const cmsUInt32Number written =
         cmsGetProfileInfoASCII(profile.Get(), cmsInfoDescription, "en", "US", buffer, limit);
@@ -69,7 +70,8 @@ int LcmsValidateProfileUsingColorSpace(void *profileClass, int code) {
                            cmsIsIntentSupported(profile, INTENT_PERCEPTUAL, LCMS_USED_AS_OUTPUT)
                        ? 1
                        : 0;
-        default: return 0;
+        default:
+            return 0;
     }
 }
 
@@ -82,8 +84,8 @@ void LcmsReleaseProfileClass(void *profileClass) {
 
 const TS_ProfileProvider &LcmsProfileProvider() {
     static constexpr TS_ProfileProvider provider = {
-        LcmsGetAsciiDescription,           LcmsGetProfileClass, LcmsValidateProfileUsingColorSpace,
-        LcmsReleaseProfileClass,           LcmsMatchColors,     LcmsProjectOntoGamut,
+        LcmsGetAsciiDescription, LcmsGetProfileClass, LcmsValidateProfileUsingColorSpace,
+        LcmsReleaseProfileClass, LcmsMatchColors,     LcmsProjectOntoGamut,
     };
     return provider;
 }

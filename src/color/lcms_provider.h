@@ -13,8 +13,7 @@ int LcmsValidateProfileUsingColorSpace(void *profileClass, int code);
 void LcmsReleaseProfileClass(void *profileClass);
 long LcmsMatchColors(char const *source, char const *destination, char const *proofing,
                      char const *abstractProfile, void *input, void *output, int intent,
-                     unsigned long flags, long reserved, XQProgressFn progress,
-                     void *progressData);
+                     unsigned long flags, long reserved, XQProgressFn progress, void *progressData);
 long LcmsProjectOntoGamut(char const *source, char const *device, char const *destination,
                           void *input, void *output, void *outside, int intent, long tolerance,
                           XQProgressFn progress, void *progressData);

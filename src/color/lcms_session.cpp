@@ -80,10 +80,17 @@ cmsHPROFILE LcmsSession::OpenProfile(char const *path) {
 
 bool LayoutOf(int16_t format, PixelLayout *layout) {
     switch (format) {
-        case CX_FORMAT_RGB: *layout = {TYPE_RGB_8, 3, cmsSigRgbData}; return true;
-        case CX_FORMAT_CMYK: *layout = {TYPE_CMYK_8, 4, cmsSigCmykData}; return true;
-        case CX_FORMAT_GRAY: *layout = {TYPE_GRAY_8, 1, cmsSigGrayData}; return true;
-        default: return false;
+        case CX_FORMAT_RGB:
+            *layout = {TYPE_RGB_8, 3, cmsSigRgbData};
+            return true;
+        case CX_FORMAT_CMYK:
+            *layout = {TYPE_CMYK_8, 4, cmsSigCmykData};
+            return true;
+        case CX_FORMAT_GRAY:
+            *layout = {TYPE_GRAY_8, 1, cmsSigGrayData};
+            return true;
+        default:
+            return false;
     }
 }
 
@@ -94,13 +101,20 @@ bool UsableBuffer(const CX_ColorBuffer *buffer, PixelLayout *layout) {
 
 int LcmsIntent(int intent) {
     switch (intent) {
-        case 0: return INTENT_PERCEPTUAL;
-        case 1: return INTENT_RELATIVE_COLORIMETRIC;
-        case 2: return INTENT_SATURATION;
-        case 3: return INTENT_ABSOLUTE_COLORIMETRIC;
-        case 4: return INTENT_PRESERVE_K_ONLY_PERCEPTUAL;
-        case 5: return INTENT_PRESERVE_K_PLANE_PERCEPTUAL;
-        default: return -1;
+        case 0:
+            return INTENT_PERCEPTUAL;
+        case 1:
+            return INTENT_RELATIVE_COLORIMETRIC;
+        case 2:
+            return INTENT_SATURATION;
+        case 3:
+            return INTENT_ABSOLUTE_COLORIMETRIC;
+        case 4:
+            return INTENT_PRESERVE_K_ONLY_PERCEPTUAL;
+        case 5:
+            return INTENT_PRESERVE_K_PLANE_PERCEPTUAL;
+        default:
+            return -1;
     }
 }
 

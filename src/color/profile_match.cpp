@@ -4,16 +4,18 @@
 
 namespace {
 
-char const *TextOf(AFilePath *path) { return path != nullptr ? static_cast<char const *>(*path) : nullptr; }
+char const *TextOf(AFilePath *path) {
+    return path != nullptr ? static_cast<char const *>(*path) : nullptr;
+}
 
 }  // namespace
 
-TESSARINE_API long R27_XQMatchColors(AFilePath *source, AFilePath *destination,
-                                     AFilePath *proofing, AFilePath *abstractProfile, void *input,
-                                     void *output, int intent, unsigned long flags, long reserved) {
-    return tessarine::platform::XQMatchColors(TextOf(source), TextOf(destination),
-                                              TextOf(proofing), TextOf(abstractProfile), input,
-                                              output, intent, flags, reserved, nullptr, nullptr);
+TESSARINE_API long R27_XQMatchColors(AFilePath *source, AFilePath *destination, AFilePath *proofing,
+                                     AFilePath *abstractProfile, void *input, void *output,
+                                     int intent, unsigned long flags, long reserved) {
+    return tessarine::platform::XQMatchColors(TextOf(source), TextOf(destination), TextOf(proofing),
+                                              TextOf(abstractProfile), input, output, intent, flags,
+                                              reserved, nullptr, nullptr);
 }
 
 TESSARINE_API long R27_XQProjectOntoGamut(AFilePath *source, AFilePath *device,

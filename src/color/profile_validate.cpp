@@ -7,12 +7,18 @@ namespace {
 // (use << 16) | buffer format; see EICCProfileType.
 int FitnessCode(EICCProfileType kind) {
     switch (kind) {
-        case 1: return 0x10001;
-        case 2: return 0x10002;
-        case 3: return 0x1000B;
-        case 4: return 0x20001;
-        case 5: return 0x20002;
-        default: return 0;
+        case 1:
+            return 0x10001;
+        case 2:
+            return 0x10002;
+        case 3:
+            return 0x1000B;
+        case 4:
+            return 0x20001;
+        case 5:
+            return 0x20002;
+        default:
+            return 0;
     }
 }
 

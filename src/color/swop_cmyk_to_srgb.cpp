@@ -17,7 +17,8 @@ extern "C" TESSARINE_API void CX_SWOPCmyk2SRgb(const uint8_t *cmyk, uint8_t *rgb
     const double mf[2] = {1 - m, m};
     const double yf[2] = {1 - y, y};
     double weight[8];
-    for (int i = 0; i < 8; ++i) weight[i] = cf[i & 1] * mf[(i >> 1) & 1] * yf[(i >> 2) & 1] * (1 - k);
+    for (int i = 0; i < 8; ++i)
+        weight[i] = cf[i & 1] * mf[(i >> 1) & 1] * yf[(i >> 2) & 1] * (1 - k);
     double lab[3];
     for (int row = 0; row < 3; ++row) {
         const int32_t *P = CX_SwopPrimaries[row];

@@ -17,9 +17,13 @@ AFilePath::AFilePath(AFilePath const &other) : path_(other.path_) {}
 
 AFilePath::~AFilePath() = default;
 
-AFilePath::operator char const *() { return path_; }
+AFilePath::operator char const *() {
+    return path_;
+}
 
-AFilePath::operator AString const &() const { return path_; }
+AFilePath::operator AString const &() const {
+    return path_;
+}
 
 AFilePath &AFilePath::operator+=(AString const &name) {
     char const *folder = path_;

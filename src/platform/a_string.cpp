@@ -35,6 +35,10 @@ AString::AString(char const *text) : text_(text == nullptr ? nullptr : JoinText(
 AString::AString(AString const &other)
     : text_(other.text_ == nullptr ? nullptr : JoinText(other.text_)) {}
 
-AString::~AString() { FreeText(text_); }
+AString::~AString() {
+    FreeText(text_);
+}
 
-AString::operator char const *() const { return text_ == nullptr ? "" : text_; }
+AString::operator char const *() const {
+    return text_ == nullptr ? "" : text_;
+}

@@ -19,16 +19,20 @@ using namespace tessarine::color;
 
 // The grid as published: per plane, rows by r node, groups by g node.
 const char *const kGridText[4][5] = {
-    {"165 255 255 255 249 / 196 216 255 247 237 / 214 232 232 227 198 / 193 201 201 196 181 / 178 176 163 140 114",
-     "114 198 244 249 242 / 135 163 237 234 227 / 193 209 209 211 191 / 183 191 191 191 168 / 173 168 155 135 107",
-     "81 89 176 209 216 / 79 84 160 193 204 / 102 114 137 165 165 / 147 155 160 158 132 / 153 147 135 114 86",
+    {"165 255 255 255 249 / 196 216 255 247 237 / 214 232 232 227 198 / 193 201 201 196 181 / 178 "
+     "176 163 140 114",
+     "114 198 244 249 242 / 135 163 237 234 227 / 193 209 209 211 191 / 183 191 191 191 168 / 173 "
+     "168 155 135 107",
+     "81 89 176 209 216 / 79 84 160 193 204 / 102 114 137 165 165 / 147 155 160 158 132 / 153 147 "
+     "135 114 86",
      "38 38 68 150 176 / 45 45 51 135 163 / 53 56 61 99 130 / 76 79 79 84 89 / 112 109 99 79 51",
      "0 0 0 86 124 / 0 0 0 73 117 / 0 0 0 33 89 / 0 0 0 0 45 / 0 0 2 5 0"},
     {"135 252 249 242 229 / 84 84 216 214 209 / 71 61 63 109 142 / 0 0 0 0 28 / 0 0 0 0 0",
      "188 249 255 242 227 / 107 130 216 214 206 / 76 63 63 119 142 / 0 0 0 0 35 / 0 0 0 0 0",
      "244 252 249 232 216 / 201 211 227 211 198 / 68 76 102 140 142 / 0 0 0 10 56 / 0 0 0 0 0",
      "244 252 247 219 198 / 229 237 234 204 186 / 158 158 158 158 140 / 38 38 38 56 68 / 0 0 0 0 0",
-     "242 242 239 211 183 / 229 227 227 201 173 / 181 176 173 168 135 / 84 84 89 94 73 / 7 2 0 0 0"},
+     "242 242 239 211 183 / 229 227 227 201 173 / 181 176 173 168 135 / 84 84 89 94 73 / 7 2 0 0 "
+     "0"},
     {"130 84 0 0 0 / 227 135 20 0 0 / 255 244 137 0 0 / 255 244 188 94 0 / 242 227 176 109 51",
      "163 71 0 0 0 / 216 127 17 0 0 / 255 242 124 0 0 / 255 244 188 91 0 / 242 227 176 107 45",
      "255 124 0 0 0 / 255 168 7 0 0 / 255 221 102 0 0 / 255 244 186 81 0 / 242 227 173 102 38",
@@ -67,9 +71,9 @@ int GridText(int plane, int r, int g, int b) {
 }
 
 void ReferenceCmyk(int r, int g, int b, int out[4]) {
-    const int W[2][3] = {{CX_RgbWeight[r & 63], CX_RgbWeight[g & 63], CX_RgbWeight[b & 63]},
-                         {CX_RgbWeight[64 - (r & 63)], CX_RgbWeight[64 - (g & 63)],
-                          CX_RgbWeight[64 - (b & 63)]}};
+    const int W[2][3] = {
+        {CX_RgbWeight[r & 63], CX_RgbWeight[g & 63], CX_RgbWeight[b & 63]},
+        {CX_RgbWeight[64 - (r & 63)], CX_RgbWeight[64 - (g & 63)], CX_RgbWeight[64 - (b & 63)]}};
     for (int plane = 0; plane < 4; ++plane) {
         int32_t sum = 0;
         for (int dr = 0; dr < 2; ++dr)
@@ -81,7 +85,9 @@ void ReferenceCmyk(int r, int g, int b, int out[4]) {
     }
 }
 
-double G(double t) { return t <= 0.2069 ? (t - 0.137931) * 0.1284191601386927 : t * t * t; }
+double G(double t) {
+    return t <= 0.2069 ? (t - 0.137931) * 0.1284191601386927 : t * t * t;
+}
 
 void ToLinear(double f, double a, double b, double Y, double rgb[3]) {
     double X = 95.04 * G(f + a * 0.002);
@@ -292,10 +298,9 @@ TEST(SRgbToSwopCmyk, EveryColourMatchesTheTrilinearModel) {
 TEST(SwopCmykToSRgb, CornersOfTheInkCube) {
     // The sixteen corners against the model; paper white and full black by hand.
     for (int i = 0; i < 16; ++i) {
-        const uint8_t cmyk[4] = {static_cast<uint8_t>(i & 1 ? 255 : 0),
-                                 static_cast<uint8_t>(i & 2 ? 255 : 0),
-                                 static_cast<uint8_t>(i & 4 ? 255 : 0),
-                                 static_cast<uint8_t>(i & 8 ? 255 : 0)};
+        const uint8_t cmyk[4] = {
+            static_cast<uint8_t>(i & 1 ? 255 : 0), static_cast<uint8_t>(i & 2 ? 255 : 0),
+            static_cast<uint8_t>(i & 4 ? 255 : 0), static_cast<uint8_t>(i & 8 ? 255 : 0)};
         int want[3];
         ReferenceSRgbFromCmyk(cmyk, want);
         EXPECT_EQ(RgbFromCmyk(cmyk[0], cmyk[1], cmyk[2], cmyk[3]),
@@ -339,7 +344,9 @@ TEST(SwopCmykToSRgb, OutOfGamutColourIsDesaturatedNotClipped) {
 
 // ---- Lab to sRGB -------------------------------------------------------------------
 
-TEST(LabToSRgb, WhiteStopsAt254) { EXPECT_EQ(RgbFromLab(255, 0, 0), (std::vector<int>{254, 254, 254})); }
+TEST(LabToSRgb, WhiteStopsAt254) {
+    EXPECT_EQ(RgbFromLab(255, 0, 0), (std::vector<int>{254, 254, 254}));
+}
 
 TEST(LabToSRgb, BlackAndMiddleGray) {
     EXPECT_EQ(RgbFromLab(0, 0, 0), (std::vector<int>{0, 0, 0}));

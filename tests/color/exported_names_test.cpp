@@ -13,11 +13,13 @@ namespace {
 
 // The return types, which a decorated name does not carry.
 static_assert(std::is_same_v<decltype(&RenderingIntentR27ToColorDev), int (*)(int const &)>);
-static_assert(std::is_same_v<decltype(&getICCProfileFlags), unsigned long (*)(int, int, int, int, int)>);
+static_assert(
+    std::is_same_v<decltype(&getICCProfileFlags), unsigned long (*)(int, int, int, int, int)>);
 static_assert(std::is_same_v<decltype(&getProfileInfo), AString (*)(AFilePath &, AString &)>);
 static_assert(std::is_same_v<decltype(&ValidateProfileType),
                              int (*)(AFilePath const &, EICCProfileType const &)>);
-static_assert(std::is_same_v<decltype(&ProfileExists), int (*)(AFilePath const &, AString const &)>);
+static_assert(
+    std::is_same_v<decltype(&ProfileExists), int (*)(AFilePath const &, AString const &)>);
 static_assert(std::is_same_v<decltype(&R27_XQMatchColors),
                              long (*)(AFilePath *, AFilePath *, AFilePath *, AFilePath *, void *,
                                       void *, int, unsigned long, long)>);
@@ -44,7 +46,8 @@ TEST(ExportedNames, DecoratedNamesDemangleToTheServiceSignatures) {
         {"R27_XQMatchColors(AFilePath*, AFilePath*, AFilePath*, AFilePath*, void*, void*, int, "
          "unsigned long, long)",
          false},
-        {"R27_XQProjectOntoGamut(AFilePath*, AFilePath*, AFilePath*, void*, void*, void*, int, long)",
+        {"R27_XQProjectOntoGamut(AFilePath*, AFilePath*, AFilePath*, void*, void*, void*, int, "
+         "long)",
          false},
         {"AString::AString(char const*)", false},
         {"AString::AString(AString const&)", false},

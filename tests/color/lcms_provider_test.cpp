@@ -17,16 +17,19 @@ using tessarine::testing::FileFailureHit;
 
 class LcmsProvider : public cxtest::ProfileSandbox {};
 
-int BytesOf(int16_t format) { return format == CX_FORMAT_RGB ? 3 : format == CX_FORMAT_CMYK ? 4 : 1; }
+int BytesOf(int16_t format) {
+    return format == CX_FORMAT_RGB ? 3 : format == CX_FORMAT_CMYK ? 4 : 1;
+}
 
 struct MatchResult {
     long status;
     std::vector<uint8_t> out;
 };
 
-MatchResult Match(const std::string &from, int16_t inFormat, const std::string &to, int16_t outFormat,
-                  std::vector<uint8_t> colours, int intent = 0, unsigned long flags = 0,
-                  const char *proof = nullptr, const char *abstractPath = nullptr) {
+MatchResult Match(const std::string &from, int16_t inFormat, const std::string &to,
+                  int16_t outFormat, std::vector<uint8_t> colours, int intent = 0,
+                  unsigned long flags = 0, const char *proof = nullptr,
+                  const char *abstractPath = nullptr) {
     const int32_t count = static_cast<int32_t>(colours.size()) / BytesOf(inFormat);
     std::vector<uint8_t> out(static_cast<size_t>(count * BytesOf(outFormat)), 0xEE);
     CX_ColorBuffer in{inFormat, count, colours.data()};
@@ -124,7 +127,8 @@ TEST_F(LcmsProvider, FitnessFollowsClassAndColourSpace) {
     EXPECT_EQ(Fitness(gray), (std::vector<int>{0, 0, 1, 0, 0}));
     EXPECT_EQ(Fitness(kCmykProfile), (std::vector<int>{0, 1, 0, 0, 1}));
     EXPECT_EQ(Fitness(lab), (std::vector<int>{0, 0, 0, 0, 0})) << "an abstract Lab profile";
-    EXPECT_EQ(Fitness(scannerRgb), (std::vector<int>{1, 0, 0, 0, 0})) << "input devices are sources only";
+    EXPECT_EQ(Fitness(scannerRgb), (std::vector<int>{1, 0, 0, 0, 0}))
+        << "input devices are sources only";
 }
 
 TEST_F(LcmsProvider, UnreadableProfileIsFitForNothing) {
@@ -172,12 +176,14 @@ TEST_F(LcmsProvider, SRgbToSRgbIsTheIdentityWithinOne) {
     std::vector<uint8_t> colours;
     for (int r = 0; r < 256; r += 5)
         for (int g = 0; g < 256; g += 5)
-            for (int b = 0; b < 256; b += 5) colours.insert(colours.end(), {uint8_t(r), uint8_t(g), uint8_t(b)});
+            for (int b = 0; b < 256; b += 5)
+                colours.insert(colours.end(), {uint8_t(r), uint8_t(g), uint8_t(b)});
     for (int intent = 0; intent <= 3; ++intent) {
         const MatchResult m = Match(srgb, 1, srgb, 1, colours, intent);
         ASSERT_EQ(m.status, XQ_OK);
         int worst = 0;
-        for (size_t i = 0; i < colours.size(); ++i) worst = std::max(worst, std::abs(m.out[i] - colours[i]));
+        for (size_t i = 0; i < colours.size(); ++i)
+            worst = std::max(worst, std::abs(m.out[i] - colours[i]));
         EXPECT_LE(worst, 1) << "intent " << intent;
     }
 }
@@ -225,7 +231,8 @@ TEST_F(LcmsProvider, ProofingProfileIsUsedOnlyWithItsFlag) {
 }
 
 TEST_F(LcmsProvider, GamutWarningPaintsTheAlarmColour) {
-    const MatchResult m = Match(srgb, 1, srgb, 1, {0, 0, 255, 128, 128, 128}, 0, 2 | 4, kCmykProfile);
+    const MatchResult m =
+        Match(srgb, 1, srgb, 1, {0, 0, 255, 128, 128, 128}, 0, 2 | 4, kCmykProfile);
     ASSERT_EQ(m.status, XQ_OK);
     ExpectNear({m.out.begin(), m.out.begin() + 3}, {0x7F, 0x7F, 0x7F}, 0);
     // Without proofing the warning has nothing to check against.
@@ -247,7 +254,8 @@ TEST_F(LcmsProvider, AbstractProfileActsInTheConnectionSpace) {
     const MatchResult identity = Match(srgb, 1, srgb, 1, colours, 0, 0, nullptr, lab.c_str());
     ASSERT_EQ(identity.status, XQ_OK);
     ExpectNear(identity.out, {0, 0, 255, 128, 128, 128, 30, 200, 90}, 1);
-    const MatchResult bright = Match(srgb, 1, srgb, 1, {128, 128, 128}, 0, 0, nullptr, brighter.c_str());
+    const MatchResult bright =
+        Match(srgb, 1, srgb, 1, {128, 128, 128}, 0, 0, nullptr, brighter.c_str());
     ASSERT_EQ(bright.status, XQ_OK);
     EXPECT_GT(bright.out[1], 160);
 }
@@ -291,18 +299,23 @@ TEST_F(LcmsProvider, BadDescriptorsAndPathsAreArgumentErrors) {
     CX_ColorBuffer rgb{CX_FORMAT_RGB, 2, pixels};
     CX_ColorBuffer other{CX_FORMAT_RGB, 2, pixels + 6};
     AFilePath s(srgb.c_str());
-    EXPECT_EQ(R27_XQMatchColors(&s, &s, nullptr, nullptr, nullptr, &other, 0, 0, 0), XQ_ERR_ARGUMENT);
+    EXPECT_EQ(R27_XQMatchColors(&s, &s, nullptr, nullptr, nullptr, &other, 0, 0, 0),
+              XQ_ERR_ARGUMENT);
     EXPECT_EQ(R27_XQMatchColors(&s, &s, nullptr, nullptr, &rgb, nullptr, 0, 0, 0), XQ_ERR_ARGUMENT);
-    EXPECT_EQ(R27_XQMatchColors(nullptr, &s, nullptr, nullptr, &rgb, &other, 0, 0, 0), XQ_ERR_ARGUMENT);
-    EXPECT_EQ(R27_XQMatchColors(&s, nullptr, nullptr, nullptr, &rgb, &other, 0, 0, 0), XQ_ERR_ARGUMENT);
+    EXPECT_EQ(R27_XQMatchColors(nullptr, &s, nullptr, nullptr, &rgb, &other, 0, 0, 0),
+              XQ_ERR_ARGUMENT);
+    EXPECT_EQ(R27_XQMatchColors(&s, nullptr, nullptr, nullptr, &rgb, &other, 0, 0, 0),
+              XQ_ERR_ARGUMENT);
     CX_ColorBuffer bad{3, 2, pixels};
     EXPECT_EQ(R27_XQMatchColors(&s, &s, nullptr, nullptr, &bad, &other, 0, 0, 0), XQ_ERR_ARGUMENT);
     CX_ColorBuffer fewer{CX_FORMAT_RGB, 1, pixels + 6};
     EXPECT_EQ(R27_XQMatchColors(&s, &s, nullptr, nullptr, &rgb, &fewer, 0, 0, 0), XQ_ERR_ARGUMENT);
     CX_ColorBuffer negative{CX_FORMAT_RGB, -1, pixels};
-    EXPECT_EQ(R27_XQMatchColors(&s, &s, nullptr, nullptr, &negative, &negative, 0, 0, 0), XQ_ERR_ARGUMENT);
+    EXPECT_EQ(R27_XQMatchColors(&s, &s, nullptr, nullptr, &negative, &negative, 0, 0, 0),
+              XQ_ERR_ARGUMENT);
     CX_ColorBuffer noPixels{CX_FORMAT_RGB, 2, nullptr};
-    EXPECT_EQ(R27_XQMatchColors(&s, &s, nullptr, nullptr, &noPixels, &other, 0, 0, 0), XQ_ERR_ARGUMENT);
+    EXPECT_EQ(R27_XQMatchColors(&s, &s, nullptr, nullptr, &noPixels, &other, 0, 0, 0),
+              XQ_ERR_ARGUMENT);
     CX_ColorBuffer none{CX_FORMAT_RGB, 0, nullptr};
     EXPECT_EQ(R27_XQMatchColors(&s, &s, nullptr, nullptr, &none, &none, 0, 0, 0), XQ_OK);
     AFilePath m(missing.c_str());
@@ -327,14 +340,14 @@ TEST_F(LcmsProvider, ProgressAfterEachRunAndCancel) {
     CX_ColorBuffer outBuffer{CX_FORMAT_RGB, 200000, out.data()};
     const TS_ProfileProvider *p = TS_DefaultProfileProvider();
     Progress progress;
-    EXPECT_EQ(p->XQMatchColors(srgb.c_str(), srgb.c_str(), nullptr, nullptr, &inBuffer, &outBuffer, 0,
-                               0, 0, OnProgress, &progress),
+    EXPECT_EQ(p->XQMatchColors(srgb.c_str(), srgb.c_str(), nullptr, nullptr, &inBuffer, &outBuffer,
+                               0, 0, 0, OnProgress, &progress),
               XQ_OK);
     EXPECT_EQ(progress.percents, (std::vector<int>{32, 65, 98, 100}));
     Progress stop;
     stop.stopAtFirst = true;
-    EXPECT_EQ(p->XQMatchColors(srgb.c_str(), srgb.c_str(), nullptr, nullptr, &inBuffer, &outBuffer, 0,
-                               0, 0, OnProgress, &stop),
+    EXPECT_EQ(p->XQMatchColors(srgb.c_str(), srgb.c_str(), nullptr, nullptr, &inBuffer, &outBuffer,
+                               0, 0, 0, OnProgress, &stop),
               XQ_ERR_CANCELLED);
     EXPECT_EQ(stop.percents.size(), 1u);
 }
@@ -348,7 +361,8 @@ TEST_F(LcmsProvider, MatchingSurvivesEveryAllocationFailure) {
     const int64_t allocations = tstest::ForEachAllocationFailure([&](int64_t) {
         std::vector<uint8_t> out(3, 0xEE);
         CX_ColorBuffer outBuffer{CX_FORMAT_GRAY, 3, out.data()};
-        const long status = R27_XQMatchColors(&from, &to, nullptr, nullptr, &in, &outBuffer, 0, 0, 0);
+        const long status =
+            R27_XQMatchColors(&from, &to, nullptr, nullptr, &in, &outBuffer, 0, 0, 0);
         if (status == XQ_OK) {
             EXPECT_EQ(out, reference.out);
         } else {
@@ -384,26 +398,30 @@ TEST_F(LcmsProvider, ProjectionBringsColoursIntoTheDeviceGamut) {
     CX_ColorBuffer outBuffer{CX_FORMAT_RGB, 3, out.data()};
     CX_ColorBuffer markBuffer{CX_FORMAT_GRAY, 3, marks.data()};
     AFilePath s(srgb.c_str()), device(kCmykProfile);
-    ASSERT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &inBuffer, &outBuffer, &markBuffer, 1, 0),
-              XQ_OK);
+    ASSERT_EQ(
+        R27_XQProjectOntoGamut(&s, &device, nullptr, &inBuffer, &outBuffer, &markBuffer, 1, 0),
+        XQ_OK);
     EXPECT_GT(std::abs(out[0] - 0) + std::abs(out[2] - 255), 60) << "blue moved inside";
     ExpectNear({out.begin() + 3, out.end()}, {128, 128, 128, 255, 255, 255}, 4);
     EXPECT_EQ(marks, (std::vector<uint8_t>{1, 0, 0}));
     // A tolerance larger than any difference marks nothing.
-    ASSERT_EQ(R27_XQProjectOntoGamut(&s, &device, &s, &inBuffer, &outBuffer, &markBuffer, 1, 1000000),
-              XQ_OK);
+    ASSERT_EQ(
+        R27_XQProjectOntoGamut(&s, &device, &s, &inBuffer, &outBuffer, &markBuffer, 1, 1000000),
+        XQ_OK);
     EXPECT_EQ(marks, (std::vector<uint8_t>{0, 0, 0}));
     // In place, and into another space.
     std::vector<uint8_t> shared = in;
     CX_ColorBuffer sharedBuffer{CX_FORMAT_RGB, 3, shared.data()};
-    ASSERT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &sharedBuffer, &sharedBuffer, &markBuffer, 1, 0),
+    ASSERT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &sharedBuffer, &sharedBuffer,
+                                     &markBuffer, 1, 0),
               XQ_OK);
     EXPECT_EQ(marks, (std::vector<uint8_t>{1, 0, 0}));
     EXPECT_EQ(shared, out);
     std::vector<uint8_t> grayOut(3);
     CX_ColorBuffer grayBuffer{CX_FORMAT_GRAY, 3, grayOut.data()};
     AFilePath g(gray.c_str());
-    ASSERT_EQ(R27_XQProjectOntoGamut(&s, &device, &g, &inBuffer, &grayBuffer, nullptr, 0, 0), XQ_OK);
+    ASSERT_EQ(R27_XQProjectOntoGamut(&s, &device, &g, &inBuffer, &grayBuffer, nullptr, 0, 0),
+              XQ_OK);
     EXPECT_NEAR(grayOut[2], 255, 1);
 }
 
@@ -414,14 +432,22 @@ TEST_F(LcmsProvider, ProjectionFailures) {
     CX_ColorBuffer wrongMark{CX_FORMAT_RGB, 1, mark};
     CX_ColorBuffer longMark{CX_FORMAT_GRAY, 2, mark};
     AFilePath s(srgb.c_str()), device(kCmykProfile), m(missing.c_str()), c(corrupt.c_str());
-    EXPECT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &in, &outBuffer, &wrongMark, 0, 0), XQ_ERR_ARGUMENT);
-    EXPECT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &in, &outBuffer, &longMark, 0, 0), XQ_ERR_ARGUMENT);
-    EXPECT_EQ(R27_XQProjectOntoGamut(&s, nullptr, nullptr, &in, &outBuffer, nullptr, 0, 0), XQ_ERR_ARGUMENT);
-    EXPECT_EQ(R27_XQProjectOntoGamut(nullptr, &device, nullptr, &in, &outBuffer, nullptr, 0, 0), XQ_ERR_ARGUMENT);
-    EXPECT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &in, &outBuffer, nullptr, 9, 0), XQ_ERR_ARGUMENT);
-    EXPECT_EQ(R27_XQProjectOntoGamut(&s, &m, nullptr, &in, &outBuffer, nullptr, 0, 0), XQ_ERR_PROFILE);
-    EXPECT_EQ(R27_XQProjectOntoGamut(&c, &device, nullptr, &in, &outBuffer, nullptr, 0, 0), XQ_ERR_PROFILE);
-    EXPECT_EQ(R27_XQProjectOntoGamut(&s, &device, &device, &in, &outBuffer, nullptr, 0, 0), XQ_ERR_TRANSFORM);
+    EXPECT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &in, &outBuffer, &wrongMark, 0, 0),
+              XQ_ERR_ARGUMENT);
+    EXPECT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &in, &outBuffer, &longMark, 0, 0),
+              XQ_ERR_ARGUMENT);
+    EXPECT_EQ(R27_XQProjectOntoGamut(&s, nullptr, nullptr, &in, &outBuffer, nullptr, 0, 0),
+              XQ_ERR_ARGUMENT);
+    EXPECT_EQ(R27_XQProjectOntoGamut(nullptr, &device, nullptr, &in, &outBuffer, nullptr, 0, 0),
+              XQ_ERR_ARGUMENT);
+    EXPECT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &in, &outBuffer, nullptr, 9, 0),
+              XQ_ERR_ARGUMENT);
+    EXPECT_EQ(R27_XQProjectOntoGamut(&s, &m, nullptr, &in, &outBuffer, nullptr, 0, 0),
+              XQ_ERR_PROFILE);
+    EXPECT_EQ(R27_XQProjectOntoGamut(&c, &device, nullptr, &in, &outBuffer, nullptr, 0, 0),
+              XQ_ERR_PROFILE);
+    EXPECT_EQ(R27_XQProjectOntoGamut(&s, &device, &device, &in, &outBuffer, nullptr, 0, 0),
+              XQ_ERR_TRANSFORM);
     EXPECT_EQ(out[0], 0xEE);
     EXPECT_EQ(mark[0], 0xEE);
 }
@@ -433,7 +459,8 @@ TEST_F(LcmsProvider, ProjectionSurvivesEveryAllocationFailure) {
     CX_ColorBuffer inBuffer{CX_FORMAT_RGB, 2, in.data()};
     CX_ColorBuffer refBuffer{CX_FORMAT_RGB, 2, reference.data()};
     CX_ColorBuffer refMarks{CX_FORMAT_GRAY, 2, referenceMarks.data()};
-    ASSERT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &inBuffer, &refBuffer, &refMarks, 0, 0), XQ_OK);
+    ASSERT_EQ(R27_XQProjectOntoGamut(&s, &device, nullptr, &inBuffer, &refBuffer, &refMarks, 0, 0),
+              XQ_OK);
     EXPECT_EQ(referenceMarks, (std::vector<uint8_t>{1, 0})) << "gray has no blue";
     tstest::ForEachAllocationFailure([&](int64_t) {
         std::vector<uint8_t> out(6, 0xEE), marks(2, 0xEE);

@@ -132,7 +132,8 @@ TEST(ProfileFlags, DependOnEachOtherInAChain) {
 }
 
 TEST(RenderingIntent, OneToOneUpToFive) {
-    for (int intent = 0; intent <= 5; ++intent) EXPECT_EQ(RenderingIntentR27ToColorDev(intent), intent);
+    for (int intent = 0; intent <= 5; ++intent)
+        EXPECT_EQ(RenderingIntentR27ToColorDev(intent), intent);
     EXPECT_EQ(RenderingIntentR27ToColorDev(6), -1);
     EXPECT_EQ(RenderingIntentR27ToColorDev(-1), -1);
     EXPECT_EQ(RenderingIntentR27ToColorDev(1000), -1);

@@ -48,8 +48,8 @@ class ProfileSandbox : public tstest::Sandbox {
         cmsHPROFILE scanner = cmsCreate_sRGBProfile();
         cmsSetDeviceClass(scanner, cmsSigInputClass);
         scannerRgb = Make("scanner.icc", scanner, "Tessarine test scanner");
-        brighter = Make("brighter.icc",
-                        cmsCreateBCHSWabstractProfile(17, 30, 1, 0, 0, 0, 0), "Brighter");
+        brighter =
+            Make("brighter.icc", cmsCreateBCHSWabstractProfile(17, 30, 1, 0, 0, 0, 0), "Brighter");
         corrupt = Path("corrupt.icc");
         WriteBytes(corrupt, std::string(300, '\x5A'));
         truncated = Path("truncated.icc");

@@ -1,8 +1,8 @@
 // Colour: the device formulas and the profile services on the system's profiles.
 #include <cstdio>
 
-#include <tessarine/profile.hpp>
 #include <tessarine/tessarine.h>
+#include <tessarine/profile.hpp>
 
 #include "demo.h"
 
@@ -47,7 +47,8 @@ void DemoColor() {
                 getICCProfileFlags(1, 1, 1, 0, 1), RenderingIntentR27ToColorDev(6));
     AFilePath folder(kFolder);
     AString fallback("(no description)");
-    const char *names[] = {"default_rgb.icc", "default_gray.icc", "default_cmyk.icc", "missing.icc"};
+    const char *names[] = {"default_rgb.icc", "default_gray.icc", "default_cmyk.icc",
+                           "missing.icc"};
     for (const char *name : names) {
         AFilePath profile(folder);
         profile += AString(name);
