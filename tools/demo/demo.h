@@ -6,3 +6,4 @@ void DemoMemory();
 void DemoRawFile();
 void DemoCore();
 void DemoGeometry();
+void DemoColor();

@@ -64,5 +64,6 @@ int main() {
     DemoRawFile();
     DemoCore();
     DemoGeometry();
+    DemoColor();
     return 0;
 }
