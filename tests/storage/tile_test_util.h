@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdint>
+#include <cstdio>
 #include <fstream>
 #include <iterator>
 #include <string>
@@ -34,13 +35,16 @@ class TileFile {
         status_ = HVT_CreateBlankTileBmpFile(imageType, bpp, width, height, 300.0, 150.0,
                                              colorModel, colorCount, colors, path_, &fd_, 9, 8, 7);
         HVT_InitFileInfo(&info_);
-        if (status_ == TS_OK) {
-            info_.descriptor = fd_;
-            BI_Bitmap view{};
-            view.tileFile = -1;
-            std::snprintf(view.tilePath, sizeof view.tilePath, "%s", path_);
-            status_ = HVT_TileFileBegin(&view, &info_, 1);
-        }
+        if (status_ == TS_OK) status_ = Open();
+    }
+    // Adds a sub-bitmap through the creator's descriptor and opens the file
+    // state again so that it sees it.
+    int32_t AddSubbmp(uint32_t width, uint32_t height) {
+        HVT_FileHeader header = *info_.header;
+        const int32_t s = HVT_AddSubbmp(fd_, &header, width, height, nullptr, nullptr);
+        if (s != TS_OK) return s;
+        HVT_TileFileEnd(&info_, 1);
+        return Open();
     }
     ~TileFile() {
         HVT_TileFileEnd(&info_, 1);
@@ -53,6 +57,12 @@ class TileFile {
     int32_t Fd() const { return fd_; }
 
   private:
+    int32_t Open() {
+        BI_Bitmap view{};
+        view.tileFile = -1;
+        std::snprintf(view.tilePath, sizeof view.tilePath, "%s", path_);
+        return HVT_TileFileBegin(&view, &info_, 1);
+    }
     char path_[513];
     int32_t fd_ = -1;
     int32_t status_;
