@@ -15,6 +15,7 @@
 
 namespace {
 
+// The input lives in a file only while one input runs.
 const std::string &InputPath() {
     static const std::string path = [] {
         const char *dir = std::getenv("TMPDIR");
@@ -22,14 +23,14 @@ const std::string &InputPath() {
         const int fd = ::mkstemp(p.data());
         if (fd < 0) std::abort();
         ::close(fd);
-        std::atexit([] { ::unlink(InputPath().c_str()); });
+        ::unlink(p.c_str());
         return p;
     }();
     return path;
 }
 
 void WriteInput(const uint8_t *data, size_t size) {
-    const int fd = ::open(InputPath().c_str(), O_WRONLY | O_TRUNC | O_CLOEXEC);
+    const int fd = ::open(InputPath().c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);
     if (fd < 0) std::abort();
     for (size_t done = 0; done < size;) {
         const ssize_t n = ::write(fd, data + done, size - done);
@@ -81,5 +82,6 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
         ReadWhole(&info, HVT_MAX_SUBBMPS);  // refused
     }
     HVT_TileFileEnd(&info, 1);
+    ::unlink(InputPath().c_str());
     return 0;
 }
