@@ -424,6 +424,24 @@ TEST_F(TileTransfer, PlainFormsCarryNeighboursInEdgeBytes) {
     EXPECT_EQ(back[0], 0xFF) << "the whole edge byte is overwritten";
 }
 
+TEST_F(TileTransfer, PlainReadOfAnUnalignedBoxPlacesLaterTilesByTruncation) {
+    TileFile f(1, 8200, 1);
+    ASSERT_EQ(f.Status(), TS_OK);
+    std::vector<uint8_t> row(1025);
+    for (size_t i = 0; i < row.size(); ++i) row[i] = static_cast<uint8_t>(i);
+    const HVT_Box all{0, 0, 8200, 1};
+    ASSERT_EQ(HVT_SaveBlock(0, f.Info(), &all, 0, row.data()), TS_OK);
+    // From x = 3 the second tile's bytes go to ((8192 - 3) * 1) / 8 = 1023,
+    // over the first tile's last byte.
+    const HVT_Box b{3, 0, 8200, 1};
+    std::vector<uint8_t> out(1030, 0xEE);
+    ASSERT_EQ(HVT_ReadBlock(0, f.Info(), &b, 0, out.data()), TS_OK);
+    EXPECT_EQ(out[0], row[0]);
+    EXPECT_EQ(out[1022], row[1022]);
+    EXPECT_EQ(out[1023], row[1024]);
+    EXPECT_EQ(out[1024], 0xEE);
+}
+
 TEST_F(TileTransfer, BoxesOutsideFindNothing) {
     TileFile f(8, 8193, 1025);
     ASSERT_EQ(f.Status(), TS_OK);
