@@ -53,7 +53,7 @@ void ReadWhole(HVT_FileInfo *info, uint8_t sub) {
     }
     // One byte more per row than the box needs: the caller's side of the contract.
     const int64_t stride = (w * d + 7) / 8 + 1;
-    if (stride * h > kMaxBuffer) {
+    if (stride > kMaxBuffer / h) {
         w = 64;
         h = 64;
     }
