@@ -8,6 +8,7 @@
 
 #include "export.h"
 #include "platform.h"
+#include "bitmap.h"
 
 TESSARINE_BEGIN_C
 
@@ -28,6 +29,113 @@ TESSARINE_API int32_t FM_SeekAndRead(int32_t fd, int32_t offset, int32_t origin,
                                      uint32_t count);
 TESSARINE_API int32_t FM_SeekAndWrite(int32_t fd, int32_t offset, int32_t origin,
                                       const void *buffer, uint32_t count);
+
+/* ---- Tile bitmap file -------------------------------------------------------- */
+
+#define HVT_MAX_SUBBMPS 10
+#define HVT_TILE_WIDTH 8192
+#define HVT_TILE_HEIGHT 1024
+
+/* The 80-byte file header, as kept in memory. On disk it is written and read
+   field by field, little-endian. */
+#pragma pack(push, 4)
+typedef struct HVT_FileHeader {
+    uint8_t stamp[6];            /* 7, 20, 19, 'D', 0, 1 */
+    uint8_t userByte1;
+    uint8_t userByte2;
+    uint8_t userByte3;
+    uint8_t bitsPerPixel;
+    uint8_t reserved1[2];
+    double xResolution;          /* at byte 12 */
+    double yResolution;
+    uint8_t colorModel;
+    uint8_t reserved2[3];
+    int32_t colorCount;
+    uint8_t imageType;
+    uint8_t subbmpCount;
+    uint8_t reserved3[2];
+    int32_t subbmpOffset[HVT_MAX_SUBBMPS]; /* entry subbmpCount: the closing '.' */
+} HVT_FileHeader;
+#pragma pack(pop)
+
+typedef struct HVT_SubbmpHdr {
+    int32_t width;
+    int32_t height;
+    int32_t tilesAcross;
+    int32_t tilesDown;
+} HVT_SubbmpHdr;
+
+typedef struct HVT_TileHdr {
+    int32_t offset; /* file offset of the tile's first byte */
+    int32_t left;
+    int32_t top;
+    int32_t right;
+    int32_t bottom;
+} HVT_TileHdr;
+
+typedef struct HVT_SubbmpSlot {
+    int32_t width;
+    int32_t height;
+    int32_t tilesAcross;
+    int32_t tilesDown;
+    HVT_TileHdr *tileHdrs; /* loaded on first use */
+} HVT_SubbmpSlot;
+
+/* The open state of one tile file. */
+typedef struct HVT_FileInfo {
+    int32_t descriptor;
+    HVT_FileHeader *header;
+    HVT_SubbmpSlot subbmps[HVT_MAX_SUBBMPS];
+    uint8_t subIndex;
+    uint8_t *colorTable;
+    uint8_t *tileBuffer; /* one whole tile at the largest */
+    MEM_Handle readHandle;
+    MEM_Handle writeHandle;
+    uint8_t *readBuffer;
+    uint8_t *writeBuffer;
+    HVT_Box readBox;
+    HVT_Box writeBox;
+    HVT_Box pendingBox;
+    HVT_Box regionBox;
+    uint8_t sessionMode;
+    uint8_t sessionFlags;
+    int32_t readRowBytes;
+    int32_t writeRowBytes;
+    int32_t bandRowBytes;
+    int32_t bandRows;
+} HVT_FileInfo;
+
+TESSARINE_API int32_t HVT_CreateBlankTileBmpFile(uint8_t imageType, uint8_t bitsPerPixel,
+                                                 uint32_t width, uint32_t height,
+                                                 double xResolution, double yResolution,
+                                                 uint8_t colorModel, int32_t colorCount,
+                                                 const uint8_t *colors, char *path, int32_t *fd,
+                                                 uint8_t userByte1, uint8_t userByte2,
+                                                 uint8_t userByte3);
+TESSARINE_API int32_t HVT_AddSubbmp(int32_t fd, HVT_FileHeader *header, uint32_t width,
+                                    uint32_t height, HVT_SubbmpHdr *subbmpHdr, uint8_t *subIndex);
+TESSARINE_API void HVT_InitFileInfo(HVT_FileInfo *info);
+TESSARINE_API int32_t HVT_TileFileBegin(const BI_Bitmap *bitmap, HVT_FileInfo *info,
+                                        int32_t openFile);
+TESSARINE_API void HVT_TileFileEnd(HVT_FileInfo *info, int32_t closeFile);
+TESSARINE_API int32_t HVT_GetSubbmpTileHdrs(uint8_t sub, HVT_FileInfo *info);
+TESSARINE_API int32_t HVT_SaveTile(uint8_t sub, HVT_FileInfo *info, int32_t tile, int32_t firstRow,
+                                   int32_t rowCount, const void *buffer);
+TESSARINE_API int32_t HVT_ReadTile(uint8_t sub, HVT_FileInfo *info, int32_t tile, int32_t firstRow,
+                                   int32_t rowCount, void *buffer);
+TESSARINE_API int32_t HVT_PixelInWhichTile(int32_t tilesAcross, int32_t x, int32_t y);
+
+/* ---- Tile block transfer ----------------------------------------------------- */
+
+TESSARINE_API int32_t HVT_SaveBlock(uint8_t sub, HVT_FileInfo *info, const HVT_Box *box,
+                                    int32_t stride, const void *buffer);
+TESSARINE_API int32_t HVT_ReadBlock(uint8_t sub, HVT_FileInfo *info, const HVT_Box *box,
+                                    int32_t stride, void *buffer);
+TESSARINE_API int32_t HVT_SaveBlockWithBitShift(uint8_t sub, HVT_FileInfo *info,
+                                                const HVT_Box *box, int32_t stride,
+                                                const void *buffer);
+TESSARINE_API int32_t HVT_ReadBlockWithBitShift(uint8_t sub, HVT_FileInfo *info,
+                                                const HVT_Box *box, int32_t stride, void *buffer);
 
 TESSARINE_END_C
 

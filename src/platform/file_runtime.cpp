@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <sys/random.h>
 #include <sys/stat.h>
+#include <sys/uio.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -28,11 +29,51 @@ bool IsDirectory(const char *path) {
     return path != nullptr && *path != '\0' && ::stat(path, &st) == 0 && S_ISDIR(st.st_mode);
 }
 
-const char *ScratchDirectory(const char *preferred) {
+const char *ScratchDirectory() {
     const char *tmpdir = std::getenv("TMPDIR");
     if (IsDirectory(tmpdir)) return tmpdir;
-    if (IsDirectory("/tmp")) return "/tmp";
-    return IsDirectory(preferred) ? preferred : nullptr;
+    return IsDirectory("/tmp") ? "/tmp" : nullptr;
+}
+
+// Gathers up to IOV_MAX rows at a time; a short transfer ends the loop.
+template <class Byte, class Call>
+int64_t TransferRows(Byte *rows0, int64_t stride, uint32_t rowBytes, uint32_t rows, Call call) {
+    constexpr uint32_t kBatch = 512;
+    int64_t done = 0;
+    for (uint32_t row = 0; row < rows;) {
+        const uint32_t batch = rows - row < kBatch ? rows - row : kBatch;
+        iovec iov[kBatch];
+        for (uint32_t i = 0; i < batch; ++i) {
+            iov[i].iov_base = const_cast<unsigned char *>(rows0 + (int64_t{row} + i) * stride);
+            iov[i].iov_len = rowBytes;
+        }
+        const size_t want = size_t{batch} * rowBytes;
+        size_t got = 0;
+        iovec *at = iov;
+        int left = static_cast<int>(batch);
+        while (got < want) {
+            const ssize_t n = call(at, left);
+            if (n < 0) {
+                if (errno == EINTR) continue;
+                return done + static_cast<int64_t>(got) > 0 ? done + static_cast<int64_t>(got) : -1;
+            }
+            if (n == 0) return done + static_cast<int64_t>(got);
+            got += static_cast<size_t>(n);
+            size_t skip = static_cast<size_t>(n);
+            while (left > 0 && skip >= at->iov_len) {
+                skip -= at->iov_len;
+                ++at;
+                --left;
+            }
+            if (left > 0 && skip > 0) {
+                at->iov_base = static_cast<unsigned char *>(at->iov_base) + skip;
+                at->iov_len -= skip;
+            }
+        }
+        done += static_cast<int64_t>(got);
+        row += batch;
+    }
+    return done;
 }
 
 }  // namespace
@@ -109,8 +150,15 @@ int32_t _lseek(int32_t fd, int32_t offset, int32_t origin) {
         default: errno = EINVAL; return -1;
     }
     if (whence != SEEK_SET) {
-        // Refuse before moving when the result would pass a 32-bit offset.
-        const off_t base = ::lseek(fd, 0, whence);
+        // Refuse before moving when the result would pass a 32-bit offset;
+        // a refused seek leaves the position where it was.
+        off_t base;
+        if (whence == SEEK_CUR) {
+            base = ::lseek(fd, 0, SEEK_CUR);
+        } else {
+            struct stat st{};
+            base = ::fstat(fd, &st) == 0 ? st.st_size : -1;
+        }
         if (base < 0) return -1;
         const off_t target = base + offset;
         if (target < 0 || target > INT32_MAX) {
@@ -133,12 +181,32 @@ int32_t _tell(int32_t fd) {
     return at < 0 ? -1 : static_cast<int32_t>(at);
 }
 
+int64_t _filelength(int32_t fd) {
+    struct stat st{};
+    return ::fstat(fd, &st) == 0 ? static_cast<int64_t>(st.st_size) : -1;
+}
+
+int64_t _readrows(int32_t fd, unsigned char *rows0, int64_t stride, uint32_t rowBytes,
+                  uint32_t rows) {
+    if (FailInjected(injection::kRead)) return -1;
+    return TransferRows(rows0, stride, rowBytes, rows,
+                        [fd](iovec *iov, int n) { return ::readv(fd, iov, n); });
+}
+
+int64_t _writerows(int32_t fd, const unsigned char *rows0, int64_t stride, uint32_t rowBytes,
+                   uint32_t rows) {
+    if (FailInjected(injection::kWrite)) return -1;
+    return TransferRows(rows0, stride, rowBytes, rows,
+                        [fd](iovec *iov, int n) { return ::writev(fd, iov, n); });
+}
+
 int32_t _close(int32_t fd) { return ::close(fd); }
 
 int32_t _unlink(const char *path) { return path ? ::unlink(path) : -1; }
 
 char *_tempnam(const char *directory, const char *prefix) {
-    const char *dir = ScratchDirectory(directory);
+    (void)directory;
+    const char *dir = ScratchDirectory();
     if (dir == nullptr) return nullptr;
     static constexpr char kAlphabet[] = "abcdefghijklmnopqrstuvwxyz0123456789";
     const size_t bytes = std::strlen(dir) + 1 + std::strlen(prefix) + 12 + 1;

@@ -29,11 +29,21 @@ int32_t _write(int32_t fd, const void *buffer, uint32_t count);
 // New position, or -1 (also when it would pass a signed 32-bit offset).
 int32_t _lseek(int32_t fd, int32_t offset, int32_t origin);
 int32_t _tell(int32_t fd);
+// Length of the open file, or -1.
+int64_t _filelength(int32_t fd);
+// Reads `rows` runs of `rowBytes` bytes that follow one another in the file,
+// from the current position, into memory rows `stride` bytes apart; counts as
+// one read. Bytes moved, or -1.
+int64_t _readrows(int32_t fd, unsigned char *rows0, int64_t stride, uint32_t rowBytes,
+                  uint32_t rows);
+// The opposite: memory rows `stride` apart to one run in the file; one write.
+int64_t _writerows(int32_t fd, const unsigned char *rows0, int64_t stride, uint32_t rowBytes,
+                   uint32_t rows);
 int32_t _close(int32_t fd);
 int32_t _unlink(const char *path);
-// A fresh name in the scratch directory ($TMPDIR when it names a directory,
-// else /tmp) with the prefix; `directory` is the caller's preference and is
-// used only when neither exists. Freed with GlobalFree. Null on failure.
+// A fresh name in the scratch directory with the prefix: $TMPDIR when it names
+// a directory, otherwise /tmp. `directory`, the original's preference, does
+// not exist here and is not consulted. Freed with GlobalFree. Null on failure.
 char *_tempnam(const char *directory, const char *prefix);
 
 }  // namespace tessarine::platform

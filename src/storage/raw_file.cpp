@@ -6,6 +6,7 @@
 
 #include "core/status.h"
 #include "platform/file_runtime.h"
+#include "storage/raw_file.h"
 
 namespace rt = tessarine::platform;
 using tessarine::kErrFileAccess;
@@ -82,3 +83,21 @@ TESSARINE_API int32_t FM_SeekAndWrite(int32_t fd, int32_t offset, int32_t origin
 }
 
 }  // extern "C"
+
+namespace tessarine::storage {
+
+int32_t FM_SeekAndReadRows(int32_t fd, int32_t offset, unsigned char *rows0, int64_t stride,
+                           uint32_t rowBytes, uint32_t rows) {
+    if (rt::_lseek(fd, offset, 0) == -1) return RecordErrno();
+    const int64_t n = rt::_readrows(fd, rows0, stride, rowBytes, rows);
+    return n != int64_t{rowBytes} * rows ? RecordErrno() : kOk;
+}
+
+int32_t FM_SeekAndWriteRows(int32_t fd, int32_t offset, const unsigned char *rows0,
+                            int64_t stride, uint32_t rowBytes, uint32_t rows) {
+    if (rt::_lseek(fd, offset, 0) == -1) return RecordErrno();
+    const int64_t n = rt::_writerows(fd, rows0, stride, rowBytes, rows);
+    return n != int64_t{rowBytes} * rows ? RecordErrno() : kOk;
+}
+
+}  // namespace tessarine::storage

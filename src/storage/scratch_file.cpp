@@ -21,6 +21,10 @@ constexpr int32_t kOwnerReadWrite = platform::kS_IREAD | platform::kS_IWRITE;
 int16_t FM_CreateScratchFile(char *path, int32_t *fd) {
     char *name = platform::_tempnam(kScratchDirectory, kScratchPrefix);
     if (name == nullptr) return kErrFileAccess;
+    if (std::strlen(name) >= kScratchPathBytes) {  // would not fit the caller's field
+        platform::GlobalFree(name);
+        return kErrFileAccess;
+    }
     FM_CopyPath(name, path);
     *fd = platform::_open(path, kScratchFlags, kOwnerReadWrite);
     platform::GlobalFree(name);

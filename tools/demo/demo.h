@@ -7,3 +7,4 @@ void DemoRawFile();
 void DemoCore();
 void DemoGeometry();
 void DemoColor();
+void DemoTiles();

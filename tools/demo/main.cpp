@@ -65,5 +65,6 @@ int main() {
     DemoCore();
     DemoGeometry();
     DemoColor();
+    DemoTiles();
     return 0;
 }

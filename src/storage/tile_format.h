@@ -1,0 +1,110 @@
+// Byte layout of the tile bitmap file and the internal services shared by the
+// tile file, its tables and the block transfers.
+#pragma once
+
+#include <bit>
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+
+#include <tessarine/storage.h>
+
+namespace tessarine::storage {
+
+inline constexpr int32_t kFileHeaderBytes = 80;
+inline constexpr int32_t kSubbmpHdrBytes = 16;
+inline constexpr int32_t kTileHdrBytes = 20;
+inline constexpr int32_t kTileWidth = HVT_TILE_WIDTH;
+inline constexpr int32_t kTileHeight = HVT_TILE_HEIGHT;
+inline constexpr int32_t kMaxSubbmps = HVT_MAX_SUBBMPS;
+inline constexpr uint8_t kStamp[6] = {7, 20, 19, 0x44, 0, 1};
+inline constexpr uint8_t kClosingByte = '.';
+
+static_assert(sizeof(HVT_FileHeader) == 80);
+static_assert(offsetof(HVT_FileHeader, xResolution) == 12);
+static_assert(offsetof(HVT_FileHeader, yResolution) == 20);
+static_assert(offsetof(HVT_FileHeader, colorModel) == 28);
+static_assert(offsetof(HVT_FileHeader, colorCount) == 32);
+static_assert(offsetof(HVT_FileHeader, imageType) == 36);
+static_assert(offsetof(HVT_FileHeader, subbmpCount) == 37);
+static_assert(offsetof(HVT_FileHeader, subbmpOffset) == 40);
+static_assert(sizeof(HVT_SubbmpHdr) == 16);
+static_assert(sizeof(HVT_TileHdr) == 20);
+
+inline void PutU32(uint8_t *at, uint32_t v) {
+    at[0] = static_cast<uint8_t>(v);
+    at[1] = static_cast<uint8_t>(v >> 8);
+    at[2] = static_cast<uint8_t>(v >> 16);
+    at[3] = static_cast<uint8_t>(v >> 24);
+}
+inline uint32_t GetU32(const uint8_t *at) {
+    return uint32_t{at[0]} | uint32_t{at[1]} << 8 | uint32_t{at[2]} << 16 | uint32_t{at[3]} << 24;
+}
+inline void PutI32(uint8_t *at, int32_t v) { PutU32(at, static_cast<uint32_t>(v)); }
+inline int32_t GetI32(const uint8_t *at) { return static_cast<int32_t>(GetU32(at)); }
+inline void PutF64(uint8_t *at, double v) {
+    const auto bits = std::bit_cast<uint64_t>(v);
+    PutU32(at, static_cast<uint32_t>(bits));
+    PutU32(at + 4, static_cast<uint32_t>(bits >> 32));
+}
+inline double GetF64(const uint8_t *at) {
+    return std::bit_cast<double>(uint64_t{GetU32(at)} | uint64_t{GetU32(at + 4)} << 32);
+}
+
+void EncodeFileHeader(const HVT_FileHeader &header, uint8_t out[kFileHeaderBytes]);
+void DecodeFileHeader(const uint8_t in[kFileHeaderBytes], HVT_FileHeader &header);
+void EncodeSubbmpHdr(const HVT_SubbmpHdr &hdr, uint8_t out[kSubbmpHdrBytes]);
+void DecodeSubbmpSlot(const uint8_t in[kSubbmpHdrBytes], HVT_SubbmpSlot &slot);
+void EncodeTileHdr(const HVT_TileHdr &tile, uint8_t out[kTileHdrBytes]);
+// Turns `count` tile headers read from the file into records, in place.
+void DecodeTileHdrsInPlace(HVT_TileHdr *tiles, int64_t count);
+
+// Bytes of one colour-table entry for a colour model; 0 for a model that has none.
+inline int32_t ColorEntryBytes(uint8_t colorModel) {
+    return colorModel == 1 ? 3 : colorModel == 2 ? 4 : 0;
+}
+
+// Length of an open file, or -1. Used only to refuse counts read from a file
+// that cannot fit in it, before allocating for them.
+int64_t FileLength(int32_t fd);
+
+// Opens the file state on `path` (see HVT_TileFileBegin).
+int32_t HVT_OpenFileInfo(const char *path, int32_t openFile, HVT_FileInfo *info);
+
+// A tile whose record can be used without leaving its tile buffer or the
+// 32-bit file range, for a depth d. Files are hostile input.
+inline bool UsableTile(const HVT_TileHdr &t, int32_t d) {
+    const int64_t w = int64_t{t.right} - t.left;
+    const int64_t h = int64_t{t.bottom} - t.top;
+    return w >= 0 && w <= kTileWidth && h >= 0 && h <= kTileHeight && t.offset >= 0 &&
+           (int64_t{t.left} * d) % 8 == 0;
+}
+
+// Row size of a tile in the file: packed to the byte.
+inline int64_t TileRowBytes(const HVT_TileHdr &t, int32_t d) {
+    return ((int64_t{t.right} - t.left) * d + 7) >> 3;
+}
+
+}  // namespace tessarine::storage
+
+namespace tessarine::storage {
+
+// Frees a fixed block at the end of a scope unless released.
+class ScopedBlock {
+  public:
+    explicit ScopedBlock(void *block) : block_(block) {}
+    ScopedBlock(const ScopedBlock &) = delete;
+    ScopedBlock &operator=(const ScopedBlock &) = delete;
+    ~ScopedBlock();
+    void *Get() const { return block_; }
+    void *Release() {
+        void *b = block_;
+        block_ = nullptr;
+        return b;
+    }
+
+  private:
+    void *block_;
+};
+
+}  // namespace tessarine::storage
