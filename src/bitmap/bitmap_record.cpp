@@ -104,7 +104,6 @@ TESSARINE_API void BI_DeleteBitmap(BI_Bitmap **bitmap) {
     if (b->pixelHandle != nullptr) MEM_FreeHdl(b->pixelHandle);
     if (b->colorTable != nullptr) MEM_FreeHdl(b->colorTable);
     if (b->colorIndex != nullptr) MEM_FreeHdl(b->colorIndex);
-    // MERGE: the path class's own destruction replaces this hook.
     if (b->profilePath != nullptr) tessarine::platform::DestroyFilePath(b->profilePath);
     MEM_FreeHdl(b);
 }

@@ -1,11 +1,22 @@
 #include "platform/file_path_hooks.h"
 
+#include <new>
+
+#include <tessarine/core.h>
+#include <tessarine/profile.hpp>
+
 namespace tessarine::platform {
 
-// MERGE: placeholder until the AFilePath class lands; it must destroy and
-// free the path. Nothing creates a path yet, so only null reaches here.
+AFilePath *CopyFilePath(const AFilePath &source) {
+    void *block = MEM_AllocPtr(0, sizeof(AFilePath));
+    if (block == nullptr) return nullptr;
+    return new (block) AFilePath(source);
+}
+
 void DestroyFilePath(AFilePath *path) {
     if (path == nullptr) return;
+    path->~AFilePath();
+    MEM_FreeHdl(path);
 }
 
 }  // namespace tessarine::platform

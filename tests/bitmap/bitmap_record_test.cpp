@@ -12,6 +12,9 @@
 #include <tessarine/bitmap.h>
 #include <tessarine/storage.h>
 
+#include <tessarine/profile.hpp>
+
+#include "platform/file_path_hooks.h"
 #include "platform/test_hooks.h"
 #include "test_support.h"
 
@@ -71,6 +74,16 @@ TEST_F(Bitmap, NewBitmapOutOfMemory) {
             BI_DeleteBitmap(&b);
         }
     });
+}
+
+TEST_F(Bitmap, DeleteDestroysTheProfilePath) {
+    BI_Bitmap *b = nullptr;
+    ASSERT_EQ(BI_NewBitmap(&b), TS_OK);
+    AFilePath source("/colour/profiles/press.icc");
+    b->profilePath = tessarine::platform::CopyFilePath(source);
+    ASSERT_NE(b->profilePath, nullptr);
+    EXPECT_STREQ(static_cast<const char *>(*b->profilePath), "/colour/profiles/press.icc");
+    BI_DeleteBitmap(&b);  // the Sandbox checks that nothing leaked
 }
 
 TEST_F(Bitmap, StrideIsPaddedToFourBytes) {
