@@ -123,8 +123,9 @@ TESSARINE_API int32_t FM_TagAppendHdrAtEnd(FM_BlockFile *file, const FM_TagHdr *
         h.endOffset -= h.payloadSize;
     }
     if (h.endOffset == h.payloadSize) h.endBlock = h.endOffset = 0;
-    if (tag != nullptr) *tag = at;
-    return WriteTagHdr(file, at, *header, data);
+    status = WriteTagHdr(file, at, *header, data);
+    if (!Failed(status) && tag != nullptr) *tag = at;
+    return status;
 }
 
 TESSARINE_API int32_t FM_TagInsertHdrAt(FM_BlockFile *file, uint32_t block, uint32_t offset,

@@ -271,8 +271,9 @@ class Model {
             h.endOffset -= P;
         }
         if (h.endOffset == P) h.endBlock = h.endOffset = 0;
-        if (tag) *tag = at;
-        return WriteTag(at, t, data);
+        s = WriteTag(at, t, data);
+        if (s >= 0 && tag) *tag = at;
+        return s;
     }
     int32_t Passed(uint64_t &walked, uint32_t length) {
         if (length < 8) return -50;
