@@ -56,9 +56,12 @@ TESSARINE_API int32_t FM_NewBlock(FM_BlockFile *file, FM_MemBlock **out) {
     FM_MemBlock *node = nullptr;
     int32_t status = FM_GetFreeMemBlock(file, &node);
     if (Failed(status)) return status;
+    // As with a fetch, a node that fails keeps its old index and dirty mark,
+    // so that no dirty node ever names a slot that cannot be written.
     FM_BlockFileHdr &h = file->header;
+    uint32_t index = 0;
     if (h.freeHead != 0) {
-        node->index = h.freeHead;
+        index = h.freeHead;
         int32_t offset = 0;
         uint8_t bytes[4];
         status = SlotOffset(file, h.freeHead, kNextField, &offset);
@@ -66,13 +69,14 @@ TESSARINE_API int32_t FM_NewBlock(FM_BlockFile *file, FM_MemBlock **out) {
         if (Failed(status)) return status;
         h.freeHead = Load32(bytes);
     } else {
-        node->index = h.nextIndex;
+        index = h.nextIndex;
         ++h.nextIndex;
         int32_t offset = 0;
         status = SlotOffset(file, h.nextIndex, 0, &offset);
         if (!Failed(status)) status = FM_Seek(file->descriptor, 0, offset);
         if (Failed(status)) return status;
     }
+    node->index = index;
     node->dirty = 1;
     SetNodeWord(node, kNextField, 0);
     SetNodeWord(node, kPrevField, 0);

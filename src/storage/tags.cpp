@@ -105,6 +105,9 @@ TESSARINE_API int32_t FM_TagReadHdr(FM_BlockFile *file, uint32_t block, uint32_t
 TESSARINE_API int32_t FM_TagAppendHdrAtEnd(FM_BlockFile *file, const FM_TagHdr *header,
                                            FM_BlockAddr *tag, FM_BlockAddr *data) {
     FM_BlockFileHdr &h = file->header;
+    // An append position lies inside its block; one beyond it comes from a
+    // damaged header and would take blocks without end.
+    if (h.endBlock != 0 && h.endOffset >= h.payloadSize) return kErrFileAccess;
     FM_MemBlock *node = nullptr;
     int32_t status = kOk;
     if (h.endBlock == 0) {

@@ -128,15 +128,16 @@ class Model {
         Node *n = nullptr;
         int32_t s = FreeNode(&n);
         if (s < 0) return s;
+        uint32_t index = h.freeHead;
         if (h.freeHead != 0) {
-            n->index = h.freeHead;
             uint8_t b[4];
             s = Read(uint64_t(h.freeHead) * S, b, 4);
             if (s < 0) return s;
             h.freeHead = Get32(b);
         } else {
-            n->index = h.nextIndex++;
+            index = h.nextIndex++;
         }
+        n->index = index;
         n->dirty = 1;
         Put32(n->img.data(), 0);
         Put32(n->img.data() + 4, 0);
@@ -255,6 +256,7 @@ class Model {
         return Move(true, at.block, at.offset, 8, b, data);
     }
     int32_t Append(const FM_TagHdr &t, Addr *tag, Addr *data) {
+        if (h.endBlock != 0 && h.endOffset >= P) return -50;
         Node *n = nullptr;
         int32_t s = 10;
         if (h.endBlock == 0) {

@@ -430,6 +430,16 @@ TEST_F(TagTest, DupEndsWhereAFullLastBlockWouldStepIntoAPassedBlock) {
     ASSERT_EQ(StatusOf(FM_BlockFileOpen(path_.c_str(), &file_, 16)), 10);
 }
 
+TEST_F(TagTest, AppendRefusesAnAppendPositionBeyondItsBlock) {
+    Append(1, 20);
+    file_->header.endOffset = 0xFFFFFFF0u;  // as a damaged header would have it
+    const uint32_t next = file_->header.nextIndex;
+    FM_TagHdr h = Tag(2, 10);
+    EXPECT_EQ(StatusOf(FM_TagAppendHdrAtEnd(file_, &h, nullptr, nullptr)), -50);
+    EXPECT_EQ(file_->header.nextIndex, next);
+    file_->header.endOffset = 20;
+}
+
 TEST_F(TagTest, DupOfAnEmptyFileGivesAnEmptyFile) {
     const std::string copy = Path("copy.blk");
     ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
