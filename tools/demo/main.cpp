@@ -62,5 +62,6 @@ int main() {
     DemoStatuses();
     DemoMemory();
     DemoRawFile();
+    DemoBlockFile();
     return 0;
 }
