@@ -71,9 +71,10 @@ TESSARINE_API int32_t FM_NewBlock(FM_BlockFile *file, FM_MemBlock **out) {
     } else {
         index = h.nextIndex;
         ++h.nextIndex;
-        int32_t offset = 0;
-        status = SlotOffset(file, h.nextIndex, 0, &offset);
-        if (!Failed(status)) status = FM_Seek(file->descriptor, 0, offset);
+        // The slot after the new block, counted without wrapping round.
+        const uint64_t after = (uint64_t(index) + 1) * h.stride;
+        if (after > uint64_t(INT32_MAX)) return kErrFileAccess;
+        status = FM_Seek(file->descriptor, 0, static_cast<int32_t>(after));
         if (Failed(status)) return status;
     }
     node->index = index;

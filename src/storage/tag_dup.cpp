@@ -79,7 +79,11 @@ int32_t CopyLiveTags(FM_BlockFile *source, FM_BlockFile *destination, uint8_t *b
         FM_TagHdr header;
         status = FM_TagReadHdr(source, at.block, at.offset, &header, nullptr, nullptr);
         if (Failed(status)) return status;
-        if (header.length < FM_TAG_HDR_BYTES) return kErrFileAccess;
+        // A tag longer than the file can hold would make the copy grow
+        // without end (its length may even wrap round the offset).
+        if (header.length < FM_TAG_HDR_BYTES ||
+            uint64_t(header.length) > passed.count * uint64_t(h.payloadSize))
+            return kErrFileAccess;
         FM_BlockAddr next;
         status = NextAddr(source, at.block, at.offset, header.length, &next, Passed::Step, &passed);
         if (Failed(status)) return status;

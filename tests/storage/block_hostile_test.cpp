@@ -102,6 +102,17 @@ TEST_F(BlockHostileTest, LengthRunningPastTheFileGivesAStatus) {
     EXPECT_EQ(StatusOf(Dup()), -50);
 }
 
+TEST_F(BlockHostileTest, LengthThatWrapsTheOffsetIsNotCopied) {
+    auto bytes = Header(P, S, 2, 1, 30);
+    PutBlock(bytes, 1, 1, {{0, 8}, {0xCF, 0xFFFFFFFFu}});
+    WriteAll(Path("h.blk"), bytes);
+    EXPECT_EQ(StatusOf(Dup()), -50);
+    FM_BlockFile *f = nullptr;
+    ASSERT_EQ(StatusOf(FM_BlockFileOpen(Path("copy.blk").c_str(), &f, 5)), 10);
+    EXPECT_EQ(f->header.nextIndex, 1u);  // nothing was appended
+    FM_BlockFileClose(&f);
+}
+
 TEST_F(BlockHostileTest, ChainInACircleThatMissesTheEnd) {
     auto bytes = Header(P, S, 3, 7, 5);
     PutBlock(bytes, 1, 2, {{2, 40}});
@@ -132,7 +143,7 @@ TEST_F(BlockHostileTest, ChainRunningIntoBlockZeroOrPastTheFile) {
 }
 
 TEST_F(BlockHostileTest, HugeFreeHeadOrNextIndexGivesAStatus) {
-    auto bytes = Header(P, S, 0xFFFFFFF0u, 1, 10);
+    auto bytes = Header(P, S, 0xFFFFFFFFu, 1, 10);
     PutBlock(bytes, 1, 1, {{1, 10}});
     FM_BlockFile *f = Open(bytes);
     FM_MemBlock *node = nullptr;

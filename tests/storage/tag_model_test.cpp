@@ -136,6 +136,7 @@ class Model {
             h.freeHead = Get32(b);
         } else {
             index = h.nextIndex++;
+            if ((uint64_t(index) + 1) * S > uint64_t(INT32_MAX)) return -50;
         }
         n->index = index;
         n->dirty = 1;
