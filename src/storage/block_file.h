@@ -66,6 +66,21 @@ int32_t PatchLink(FM_BlockFile *file, uint32_t index, uint32_t field, uint32_t v
 // Bounds walks over hostile files.
 int32_t BlocksThatExist(FM_BlockFile *file, uint64_t *count);
 
+// A temporary block of the heap, released on every way out.
+class ScratchBlock {
+  public:
+    explicit ScratchBlock(uint32_t size) : block_(MEM_AllocPtr(0, size)) {}
+    ~ScratchBlock() {
+        if (block_ != nullptr) MEM_FreeHdl(block_);
+    }
+    ScratchBlock(const ScratchBlock &) = delete;
+    ScratchBlock &operator=(const ScratchBlock &) = delete;
+    uint8_t *get() const { return static_cast<uint8_t *>(block_); }
+
+  private:
+    void *block_;
+};
+
 // Takes a cache node: a fresh one below the limit, else the least recently
 // used one (written back first when dirty). Returns 10, -5 or a write status.
 int32_t FM_GetFreeMemBlock(FM_BlockFile *file, FM_MemBlock **node);

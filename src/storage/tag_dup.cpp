@@ -21,6 +21,9 @@ struct Passed {
     uint64_t count = 0;
     bool revisit = false;  // the last step landed at offset 0 of a passed block
 
+    Passed() = default;
+    Passed(const Passed &) = delete;
+    Passed &operator=(const Passed &) = delete;
     ~Passed() {
         if (bits != nullptr) MEM_FreeHdl(bits);
     }
@@ -127,13 +130,8 @@ TESSARINE_API int32_t FM_DupTagBlockFile(const char *sourcePath, const char *des
     status = FM_BlockFileCreate(destinationPath, &destination, source->header.payloadSize,
                                 kDupCacheLimit, source->tagCallback);
     if (!Failed(status)) {
-        auto *buffer = static_cast<uint8_t *>(MEM_AllocPtr(0, source->header.payloadSize));
-        if (buffer == nullptr) {
-            status = kErrMemory;
-        } else {
-            status = CopyLiveTags(source, destination, buffer);
-            MEM_FreeHdl(buffer);
-        }
+        ScratchBlock piece(source->header.payloadSize);
+        status = piece.get() == nullptr ? kErrMemory : CopyLiveTags(source, destination, piece.get());
     }
     const int32_t closedDestination = FM_BlockFileClose(&destination);
     const int32_t closedSource = FM_BlockFileClose(&source);

@@ -59,14 +59,16 @@ uint32_t NextOf(FM_BlockFile *file, uint32_t block, int32_t *status) {
 // offset of `target`, and tells the caller where each of its tags went.
 int32_t MoveTail(FM_BlockFile *file, uint32_t insertion, FM_BlockAddr from, uint32_t target) {
     const uint32_t count = file->header.payloadSize - from.offset;
-    void *buffer = MEM_AllocPtr(0, count);
-    if (buffer == nullptr) return kErrMemory;
-    int32_t status = FM_BlockRead(file, insertion, from.offset, static_cast<int32_t>(count), buffer,
-                                  nullptr);
-    if (!Failed(status))
-        status = FM_BlockWrite(file, target, from.offset, static_cast<int32_t>(count), buffer,
-                               nullptr);
-    MEM_FreeHdl(buffer);
+    int32_t status = kOk;
+    {
+        ScratchBlock tail(count);
+        if (tail.get() == nullptr) return kErrMemory;
+        status = FM_BlockRead(file, insertion, from.offset, static_cast<int32_t>(count), tail.get(),
+                              nullptr);
+        if (!Failed(status))
+            status = FM_BlockWrite(file, target, from.offset, static_cast<int32_t>(count),
+                                   tail.get(), nullptr);
+    }
     if (Failed(status)) return status;
     if (file->tagCallback == nullptr) return kErrEmptyList;
     FM_BlockAddr at = from;

@@ -221,7 +221,9 @@ TEST_F(BlockFailureTest, NewBlockFromTheEndWithWriteBack) {
     All(4, FourDirty, [&](FM_BlockFile *f) {
         node = sentinel;
         int32_t s = FM_NewBlock(f, &node);
-        if (TS_FAILED(s)) EXPECT_EQ(node, sentinel);
+        if (TS_FAILED(s)) {
+            EXPECT_EQ(node, sentinel);
+        }
         return s;
     });
 }
@@ -254,13 +256,17 @@ TEST_F(BlockFailureTest, FetchWithWriteBack) {
     All(4, FourDirty, [&](FM_BlockFile *f) {
         FM_MemBlock *node = sentinel;
         int32_t s = FM_GetMemBlockByIndex(f, 2, &node);
-        if (TS_FAILED(s)) EXPECT_EQ(node, sentinel);
+        if (TS_FAILED(s)) {
+            EXPECT_EQ(node, sentinel);
+        }
         return s;
     }, true);
     All(16, nullptr, [&](FM_BlockFile *f) {
         FM_MemBlock *node = sentinel;
         int32_t s = FM_GetMemBlockByIndex(f, 2, &node);
-        if (TS_FAILED(s)) EXPECT_EQ(node, sentinel);
+        if (TS_FAILED(s)) {
+            EXPECT_EQ(node, sentinel);
+        }
         return s;
     });
 }
@@ -281,7 +287,9 @@ TEST_F(BlockFailureTest, ReadAndWriteAcrossBlocks) {
         uint8_t b[60];
         FM_BlockAddr a = {7, 7};
         int32_t s = FM_BlockRead(f, 1, 10, 60, b, &a);
-        if (TS_FAILED(s)) EXPECT_EQ(a, (FM_BlockAddr{7, 7}));
+        if (TS_FAILED(s)) {
+            EXPECT_EQ(a, (FM_BlockAddr{7, 7}));
+        }
         return s;
     });
     All(4, FourDirty, [](FM_BlockFile *f) {
@@ -300,13 +308,17 @@ TEST_F(BlockFailureTest, TagReadAppendDeleteRewrite) {
         FM_TagHdr t = Tag(1, 90);
         FM_BlockAddr at = {7, 7};
         int32_t s = FM_TagAppendHdrAtEnd(f, &t, &at, nullptr);
-        if (TS_FAILED(s)) EXPECT_EQ(at, (FM_BlockAddr{7, 7}));
+        if (TS_FAILED(s)) {
+            EXPECT_EQ(at, (FM_BlockAddr{7, 7}));
+        }
         return s;
     }, true);
     All(16, nullptr, [](FM_BlockFile *f) {
         FM_BlockAddr at = {1, 20}, next = {7, 7};
         int32_t s = FM_TagDelete(f, &at, &next);
-        if (TS_FAILED(s)) EXPECT_EQ(next, (FM_BlockAddr{7, 7}));
+        if (TS_FAILED(s)) {
+            EXPECT_EQ(next, (FM_BlockAddr{7, 7}));
+        }
         return s;
     });
     All(16, nullptr, [](FM_BlockFile *f) {
