@@ -26,7 +26,9 @@ std::string ScratchPath(const char *name) {
            std::to_string(getpid());
 }
 
-int32_t NoMoves(FM_BlockAddr *, FM_BlockAddr *) { return 10; }
+int32_t NoMoves(FM_BlockAddr *, FM_BlockAddr *) {
+    return 10;
+}
 
 // Fills the file; the tag addresses go to `where`.
 void AppendAll(const std::string &path, std::vector<FM_BlockAddr> &where, const uint8_t *data) {
@@ -50,7 +52,8 @@ void ReadAll(const std::string &path, const std::vector<FM_BlockAddr> &where, ui
     for (int i = 0; i < kTags; ++i) {
         FM_TagHdr tag;
         FM_BlockAddr from;
-        if (TS_FAILED(FM_TagReadHdr(file, where[i].block, where[i].offset, &tag, nullptr, nullptr)) ||
+        if (TS_FAILED(
+                FM_TagReadHdr(file, where[i].block, where[i].offset, &tag, nullptr, nullptr)) ||
             TS_FAILED(FM_GetNextAddr(file, where[i].block, where[i].offset, 8, &from)) ||
             TS_FAILED(FM_BlockRead(file, from.block, from.offset, kData, data, nullptr)))
             std::abort();

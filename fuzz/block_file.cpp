@@ -24,7 +24,9 @@ uint32_t Le32(const uint8_t *p) {
     return uint32_t(p[0]) | uint32_t(p[1]) << 8 | uint32_t(p[2]) << 16 | uint32_t(p[3]) << 24;
 }
 
-int32_t Moved(FM_BlockAddr *, FM_BlockAddr *) { return 10; }
+int32_t Moved(FM_BlockAddr *, FM_BlockAddr *) {
+    return 10;
+}
 
 // Walks the stream the way a reader of the format does: from firstBlock at
 // offset 0 to the end position, never more steps than the file has bytes,
@@ -39,11 +41,13 @@ void WalkTags(FM_BlockFile *file, size_t fileSize) {
         if (TS_FAILED(FM_TagReadHdr(file, at.block, at.offset, &tag, nullptr, &next))) return;
         if (tag.length > 8) {
             FM_BlockAddr from;
-            if (TS_FAILED(FM_GetNextAddr(file, at.block, at.offset, 8, &from)) || from.block == 0) return;
+            if (TS_FAILED(FM_GetNextAddr(file, at.block, at.offset, 8, &from)) || from.block == 0)
+                return;
             uint32_t left = tag.length - 8;
             if (left > fileSize) left = uint32_t(fileSize);
             data.resize(left);
-            if (TS_FAILED(FM_BlockRead(file, from.block, from.offset, int32_t(left), data.data(), nullptr)))
+            if (TS_FAILED(FM_BlockRead(file, from.block, from.offset, int32_t(left), data.data(),
+                                       nullptr)))
                 return;
         }
         if (next.block == at.block && next.offset <= at.offset) return;  // no progress

@@ -87,8 +87,8 @@ int32_t FM_GetFreeMemBlock(FM_BlockFile *file, FM_MemBlock **out) {
         int32_t offset = 0;
         int32_t status = SlotOffset(file, oldest->index, 0, &offset);
         if (!Failed(status))
-            status = FM_SeekAndWrite(file->descriptor, offset, 0, oldest->image,
-                                     file->header.stride);
+            status =
+                FM_SeekAndWrite(file->descriptor, offset, 0, oldest->image, file->header.stride);
         if (Failed(status)) return status;
     }
     // The ring turns: the oldest node becomes the head without unlinking.
@@ -104,8 +104,7 @@ using namespace tessarine::storage;
 
 extern "C" {
 
-TESSARINE_API int32_t FM_GetMemBlockByIndex(FM_BlockFile *file, uint32_t index,
-                                            FM_MemBlock **out) {
+TESSARINE_API int32_t FM_GetMemBlockByIndex(FM_BlockFile *file, uint32_t index, FM_MemBlock **out) {
     if (index == 0) return kErrArgument;
     if (FM_MemBlock *node = FindCached(file, index)) {
         ListRemove(AsList(node), AsListHead(&file->cacheHead));

@@ -33,10 +33,16 @@ inline void Store32(uint8_t *p, uint32_t v) {
     p[3] = uint8_t(v >> 24);
 }
 
-inline ListNode *AsList(FM_MemBlock *node) { return reinterpret_cast<ListNode *>(node); }
-inline ListNode **AsListHead(FM_MemBlock **head) { return reinterpret_cast<ListNode **>(head); }
+inline ListNode *AsList(FM_MemBlock *node) {
+    return reinterpret_cast<ListNode *>(node);
+}
+inline ListNode **AsListHead(FM_MemBlock **head) {
+    return reinterpret_cast<ListNode **>(head);
+}
 
-inline uint8_t *NodeData(FM_MemBlock *node) { return node->image + FM_BLOCK_HDR_BYTES; }
+inline uint8_t *NodeData(FM_MemBlock *node) {
+    return node->image + FM_BLOCK_HDR_BYTES;
+}
 inline uint32_t NodeWord(const FM_MemBlock *node, uint32_t field) {
     return Load32(node->image + field);
 }

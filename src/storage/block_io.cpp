@@ -15,8 +15,8 @@ using namespace tessarine::storage;
 // The out address holds the last block touched and the bytes moved in it,
 // not the true position: callers go on from there with FM_GetNextAddr.
 template <bool kWrite, typename Buffer>
-int32_t Transfer(FM_BlockFile *file, uint32_t block, uint32_t offset, int32_t count,
-                 Buffer *buffer, FM_BlockAddr *last) {
+int32_t Transfer(FM_BlockFile *file, uint32_t block, uint32_t offset, int32_t count, Buffer *buffer,
+                 FM_BlockAddr *last) {
     if (count < 1) return kOk;
     const uint32_t payload = file->header.payloadSize;
     if (offset > payload) return kErrArgument;  // would move outside the image

@@ -57,8 +57,8 @@ int32_t CopyData(FM_BlockFile *source, FM_BlockAddr from, FM_BlockFile *destinat
     const uint32_t piece = source->header.payloadSize;
     while (count > 0) {
         const uint32_t n = count < piece ? count : piece;
-        int32_t status = FM_BlockRead(source, from.block, from.offset, static_cast<int32_t>(n),
-                                      buffer, &from);
+        int32_t status =
+            FM_BlockRead(source, from.block, from.offset, static_cast<int32_t>(n), buffer, &from);
         if (!Failed(status))
             status = FM_BlockWrite(destination, to.block, to.offset, static_cast<int32_t>(n),
                                    buffer, &to);
@@ -105,8 +105,8 @@ int32_t CopyLiveTags(FM_BlockFile *source, FM_BlockFile *destination, uint8_t *b
                 FM_BlockAddr to;
                 status = FM_GetNextAddr(source, at.block, at.offset, FM_TAG_HDR_BYTES, &from);
                 if (!Failed(status))
-                    status = FM_GetNextAddr(destination, tag.block, tag.offset, FM_TAG_HDR_BYTES,
-                                            &to);
+                    status =
+                        FM_GetNextAddr(destination, tag.block, tag.offset, FM_TAG_HDR_BYTES, &to);
                 if (!Failed(status))
                     status = CopyData(source, from, destination, to,
                                       header.length - FM_TAG_HDR_BYTES, buffer);
@@ -131,7 +131,8 @@ TESSARINE_API int32_t FM_DupTagBlockFile(const char *sourcePath, const char *des
                                 kDupCacheLimit, source->tagCallback);
     if (!Failed(status)) {
         ScratchBlock piece(source->header.payloadSize);
-        status = piece.get() == nullptr ? kErrMemory : CopyLiveTags(source, destination, piece.get());
+        status =
+            piece.get() == nullptr ? kErrMemory : CopyLiveTags(source, destination, piece.get());
     }
     const int32_t closedDestination = FM_BlockFileClose(&destination);
     const int32_t closedSource = FM_BlockFileClose(&source);

@@ -156,7 +156,8 @@ TESSARINE_API int32_t FM_TagInsertHdrAt(FM_BlockFile *file, uint32_t block, uint
             room += found.length;
             if (following.block == 0) break;
             FM_BlockAddr after;
-            status = FM_TagReadHdr(file, following.block, following.offset, &found, nullptr, &after);
+            status =
+                FM_TagReadHdr(file, following.block, following.offset, &found, nullptr, &after);
             if (Failed(status)) return status;
             if (found.kind != 0) break;
             following = after;
@@ -302,7 +303,8 @@ TESSARINE_API int32_t FM_TagRewriteHdr(FM_BlockFile *file, uint32_t block, uint3
     FM_BlockAddr following{};
     int32_t status = FM_TagDelete(file, &at, &following);
     if (Failed(status)) return status;
-    if (following.block != 0) return FM_TagInsertHdrAt(file, block, offset, header, tag, data, next);
+    if (following.block != 0)
+        return FM_TagInsertHdrAt(file, block, offset, header, tag, data, next);
     if (next != nullptr) *next = {0, 0};
     return FM_TagAppendHdrAtEnd(file, header, tag, data);
 }

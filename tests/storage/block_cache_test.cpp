@@ -57,7 +57,8 @@ TEST_F(BlockCacheTest, LimitThreeFailsOnTheFourthBlock) {
     EXPECT_EQ(StatusOf(FM_NewBlock(file_, &node)), -5);
     EXPECT_EQ(file_->cachedCount, 3u);
     Reopen(3);
-    for (uint32_t i = 1; i <= 3; ++i) ASSERT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, i, &node)), 10);
+    for (uint32_t i = 1; i <= 3; ++i)
+        ASSERT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, i, &node)), 10);
     EXPECT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, 4, &node)), -5);
     // A cached block is still found.
     EXPECT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, 2, &node)), 10);
@@ -135,7 +136,8 @@ TEST_F(BlockCacheTest, EvictionWritesOnlyDirtyNodesAndKeepsTheirMarks) {
     Grow(4);
     Reopen(4);
     FM_MemBlock *node = nullptr;
-    for (uint32_t i = 1; i <= 4; ++i) ASSERT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, i, &node)), 10);
+    for (uint32_t i = 1; i <= 4; ++i)
+        ASSERT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, i, &node)), 10);
     const uint8_t z = 0xCC;
     ASSERT_EQ(StatusOf(FM_BlockWrite(file_, 1, 0, 1, &z, nullptr)), 10);  // 1 is now newest
     ASSERT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, 2, &node)), 10);
@@ -188,7 +190,8 @@ TEST_F(BlockCacheTest, RecycledNodeKeepsIndexAndDirtyWhenItsReadFails) {
     Grow(4);
     Reopen(4);
     FM_MemBlock *node = nullptr;
-    for (uint32_t i = 1; i <= 4; ++i) ASSERT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, i, &node)), 10);
+    for (uint32_t i = 1; i <= 4; ++i)
+        ASSERT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, i, &node)), 10);
     // Block 9 lies past the end of the file: the read comes up short.
     EXPECT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, 9, &node)), -50);
     EXPECT_EQ(CacheIndexes(file_), (std::vector<uint32_t>{1, 4, 3, 2}));

@@ -21,15 +21,21 @@ namespace th = tessarine::testing;
 enum class Fault { Alloc, Read, Write, Seek };
 const char *Name(Fault f) {
     switch (f) {
-        case Fault::Alloc: return "allocation";
-        case Fault::Read: return "read";
-        case Fault::Write: return "write";
-        case Fault::Seek: return "seek";
+        case Fault::Alloc:
+            return "allocation";
+        case Fault::Read:
+            return "read";
+        case Fault::Write:
+            return "write";
+        case Fault::Seek:
+            return "seek";
     }
     return "";
 }
 th::FileCall Kind(Fault f) {
-    return f == Fault::Read ? th::FileCall::Read : f == Fault::Write ? th::FileCall::Write : th::FileCall::Seek;
+    return f == Fault::Read    ? th::FileCall::Read
+           : f == Fault::Write ? th::FileCall::Write
+                               : th::FileCall::Seek;
 }
 void Arm(Fault f, int64_t n) {
     th::ResetInjection();
@@ -38,9 +44,13 @@ void Arm(Fault f, int64_t n) {
     else
         th::FailFileCallAt(Kind(f), n);
 }
-bool Hit(Fault f) { return f == Fault::Alloc ? th::AllocationFailureHit() : th::FileFailureHit(Kind(f)); }
+bool Hit(Fault f) {
+    return f == Fault::Alloc ? th::AllocationFailureHit() : th::FileFailureHit(Kind(f));
+}
 
-int32_t NoMoves(FM_BlockAddr *, FM_BlockAddr *) { return 10; }
+int32_t NoMoves(FM_BlockAddr *, FM_BlockAddr *) {
+    return 10;
+}
 
 constexpr uint32_t P = 40;
 
@@ -229,7 +239,8 @@ TEST_F(BlockFailureTest, NewBlockFromTheEndWithWriteBack) {
 }
 
 TEST_F(BlockFailureTest, NewBlockFromTheFreeList) {
-    All(16, [](FM_BlockFile *f) { ASSERT_EQ(StatusOf(FM_FreeBlock(f, 2)), 10); },
+    All(
+        16, [](FM_BlockFile *f) { ASSERT_EQ(StatusOf(FM_FreeBlock(f, 2)), 10); },
         [](FM_BlockFile *f) {
             FM_MemBlock *node = nullptr;
             return FM_NewBlock(f, &node);
@@ -238,10 +249,13 @@ TEST_F(BlockFailureTest, NewBlockFromTheFreeList) {
 
 TEST_F(BlockFailureTest, FreeBlockUncachedAndCached) {
     All(16, nullptr, [](FM_BlockFile *f) { return FM_FreeBlock(f, 2); });
-    All(16, [](FM_BlockFile *f) {
-        FM_MemBlock *n = nullptr;
-        ASSERT_EQ(StatusOf(FM_GetMemBlockByIndex(f, 2, &n)), 10);
-    }, [](FM_BlockFile *f) { return FM_FreeBlock(f, 2); });
+    All(
+        16,
+        [](FM_BlockFile *f) {
+            FM_MemBlock *n = nullptr;
+            ASSERT_EQ(StatusOf(FM_GetMemBlockByIndex(f, 2, &n)), 10);
+        },
+        [](FM_BlockFile *f) { return FM_FreeBlock(f, 2); });
 }
 
 TEST_F(BlockFailureTest, InsertBlockAfterWithUncachedNeighbours) {
@@ -253,14 +267,17 @@ TEST_F(BlockFailureTest, InsertBlockAfterWithUncachedNeighbours) {
 
 TEST_F(BlockFailureTest, FetchWithWriteBack) {
     FM_MemBlock *sentinel = reinterpret_cast<FM_MemBlock *>(0x9);
-    All(4, FourDirty, [&](FM_BlockFile *f) {
-        FM_MemBlock *node = sentinel;
-        int32_t s = FM_GetMemBlockByIndex(f, 2, &node);
-        if (TS_FAILED(s)) {
-            EXPECT_EQ(node, sentinel);
-        }
-        return s;
-    }, true);
+    All(
+        4, FourDirty,
+        [&](FM_BlockFile *f) {
+            FM_MemBlock *node = sentinel;
+            int32_t s = FM_GetMemBlockByIndex(f, 2, &node);
+            if (TS_FAILED(s)) {
+                EXPECT_EQ(node, sentinel);
+            }
+            return s;
+        },
+        true);
     All(16, nullptr, [&](FM_BlockFile *f) {
         FM_MemBlock *node = sentinel;
         int32_t s = FM_GetMemBlockByIndex(f, 2, &node);
@@ -292,10 +309,13 @@ TEST_F(BlockFailureTest, ReadAndWriteAcrossBlocks) {
         }
         return s;
     });
-    All(4, FourDirty, [](FM_BlockFile *f) {
-        uint8_t b[60] = {};
-        return FM_BlockWrite(f, 1, 10, 60, b, nullptr);
-    }, true);
+    All(
+        4, FourDirty,
+        [](FM_BlockFile *f) {
+            uint8_t b[60] = {};
+            return FM_BlockWrite(f, 1, 10, 60, b, nullptr);
+        },
+        true);
 }
 
 TEST_F(BlockFailureTest, TagReadAppendDeleteRewrite) {
@@ -304,15 +324,18 @@ TEST_F(BlockFailureTest, TagReadAppendDeleteRewrite) {
         FM_BlockAddr d{}, n{};
         return FM_TagReadHdr(f, 1, 20, &h, &d, &n);
     });
-    All(16, nullptr, [](FM_BlockFile *f) {
-        FM_TagHdr t = Tag(1, 90);
-        FM_BlockAddr at = {7, 7};
-        int32_t s = FM_TagAppendHdrAtEnd(f, &t, &at, nullptr);
-        if (TS_FAILED(s)) {
-            EXPECT_EQ(at, (FM_BlockAddr{7, 7}));
-        }
-        return s;
-    }, true);
+    All(
+        16, nullptr,
+        [](FM_BlockFile *f) {
+            FM_TagHdr t = Tag(1, 90);
+            FM_BlockAddr at = {7, 7};
+            int32_t s = FM_TagAppendHdrAtEnd(f, &t, &at, nullptr);
+            if (TS_FAILED(s)) {
+                EXPECT_EQ(at, (FM_BlockAddr{7, 7}));
+            }
+            return s;
+        },
+        true);
     All(16, nullptr, [](FM_BlockFile *f) {
         FM_BlockAddr at = {1, 20}, next = {7, 7};
         int32_t s = FM_TagDelete(f, &at, &next);

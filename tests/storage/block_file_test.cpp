@@ -58,9 +58,9 @@ TEST_F(BlockFileTest, CloseWritesHeaderAndDirtyBlocksOpenReadsThemBack) {
     ASSERT_EQ(StatusOf(FM_BlockFileClose(&file)), 10);
     auto bytes = ReadAll(path);
     ASSERT_EQ(bytes.size(), 72u);
-    EXPECT_EQ(Le32(bytes, 12), 2u);  // nextIndex
-    EXPECT_EQ(Le32(bytes, 16), 1u);  // firstBlock
-    EXPECT_EQ(Le32(bytes, 20), 1u);  // lastBlock
+    EXPECT_EQ(Le32(bytes, 12), 2u);      // nextIndex
+    EXPECT_EQ(Le32(bytes, 16), 1u);      // firstBlock
+    EXPECT_EQ(Le32(bytes, 20), 1u);      // lastBlock
     EXPECT_EQ(Le32(bytes, 36 + 0), 1u);  // block 1 next: itself
     EXPECT_EQ(Le32(bytes, 36 + 4), 0u);
     EXPECT_EQ(Le32(bytes, 36 + 8), 24u);  // firstTag: none begins
@@ -143,10 +143,16 @@ TEST_F(BlockFileTest, OpenTakesStrideOnTrustButRefusesUnusableSizes) {
     EXPECT_EQ(file->header.stride, 40u);
     EXPECT_EQ(file->nodeBytes, offsetof(FM_MemBlock, image) + 40);
     ASSERT_EQ(StatusOf(FM_BlockFileClose(&file)), 10);
-    for (auto [payload, stride] : {std::pair{10u, 0u}, {10u, 11u}, {10u, 21u}, {0u, 12u},
-                                   {0u, 40u}, {0xFFFFFFF4u, 0u}, {10u, 0x80000000u}}) {
+    for (auto [payload, stride] : {std::pair{10u, 0u},
+                                   {10u, 11u},
+                                   {10u, 21u},
+                                   {0u, 12u},
+                                   {0u, 40u},
+                                   {0xFFFFFFF4u, 0u},
+                                   {10u, 0x80000000u}}) {
         make(payload, stride);
-        EXPECT_EQ(StatusOf(FM_BlockFileOpen(path.c_str(), &file, 4)), -50) << payload << " " << stride;
+        EXPECT_EQ(StatusOf(FM_BlockFileOpen(path.c_str(), &file, 4)), -50)
+            << payload << " " << stride;
     }
     FM_Delete(path.c_str());
 }

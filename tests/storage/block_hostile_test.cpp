@@ -48,7 +48,8 @@ class BlockHostileTest : public tstest::Sandbox {
         WriteAll(Path("h.blk"), bytes);
         FM_BlockFile *f = nullptr;
         EXPECT_EQ(StatusOf(FM_BlockFileOpen(Path("h.blk").c_str(), &f, 5)), 10);
-        if (f != nullptr) f->tagCallback = [](FM_BlockAddr *, FM_BlockAddr *) { return int32_t(10); };
+        if (f != nullptr)
+            f->tagCallback = [](FM_BlockAddr *, FM_BlockAddr *) { return int32_t(10); };
         return f;
     }
     int32_t Dup() { return FM_DupTagBlockFile(Path("h.blk").c_str(), Path("copy.blk").c_str()); }

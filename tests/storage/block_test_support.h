@@ -36,7 +36,9 @@ inline uint32_t ImageWord(const FM_MemBlock *node, uint32_t at) {
     for (int i = 3; i >= 0; --i) v = v << 8 | node->image[at + i];
     return v;
 }
-inline uint8_t *Data(FM_MemBlock *node) { return node->image + 12; }
+inline uint8_t *Data(FM_MemBlock *node) {
+    return node->image + 12;
+}
 
 // Block indexes in the cache, most recent first.
 inline std::vector<uint32_t> CacheIndexes(const FM_BlockFile *file) {

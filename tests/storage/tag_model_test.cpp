@@ -22,7 +22,9 @@ using tessarine::StatusOf;
 using Addr = FM_BlockAddr;
 using Bytes = std::vector<uint8_t>;
 
-uint32_t Get32(const uint8_t *p) { return uint32_t(p[0]) | p[1] << 8 | p[2] << 16 | uint32_t(p[3]) << 24; }
+uint32_t Get32(const uint8_t *p) {
+    return uint32_t(p[0]) | p[1] << 8 | p[2] << 16 | uint32_t(p[3]) << 24;
+}
 void Put32(uint8_t *p, uint32_t v) {
     for (int i = 0; i < 4; ++i) p[i] = uint8_t(v >> (8 * i));
 }
@@ -45,7 +47,8 @@ class Model {
         uint32_t payload, stride, nextIndex, first, last, freeHead, endBlock, endOffset;
     };
 
-    Model(uint32_t payload, uint8_t limit, Calls *calls) : P(payload), S(payload + 12), limit_(limit) {
+    Model(uint32_t payload, uint8_t limit, Calls *calls)
+        : P(payload), S(payload + 12), limit_(limit) {
         h = {P, S, 1, 0, 0, 0, 0, 0};
         calls_ = calls;
         WriteHeader();
@@ -174,7 +177,8 @@ class Model {
     int32_t FreeBlock(uint32_t index) {
         if (index == 0) return -4;
         uint32_t next = 0, prev = 0;
-        auto it = std::find_if(cache.begin(), cache.end(), [&](const Node &n) { return n.index == index; });
+        auto it = std::find_if(cache.begin(), cache.end(),
+                               [&](const Node &n) { return n.index == index; });
         if (it != cache.end()) {
             next = Get32(it->img.data());
             prev = Get32(it->img.data() + 4);
@@ -213,7 +217,8 @@ class Model {
         if (r->block == h.endBlock && r->offset >= h.endOffset) r->block = 0;
         return 10;
     }
-    int32_t Move(bool write, uint32_t block, uint32_t offset, int32_t count, uint8_t *buffer, Addr *last) {
+    int32_t Move(bool write, uint32_t block, uint32_t offset, int32_t count, uint8_t *buffer,
+                 Addr *last) {
         if (count < 1) return 10;
         if (offset > P) return -4;
         uint32_t left = uint32_t(count), moved = 0;
@@ -281,11 +286,14 @@ class Model {
     int32_t Passed(uint64_t &walked, uint32_t length) {
         if (length < 8) return -50;
         walked += length;
-        if (walked > 64ull * P && walked > (disk.size() / S + 1 + cache.size()) * uint64_t(P)) return -50;
+        if (walked > 64ull * P && walked > (disk.size() / S + 1 + cache.size()) * uint64_t(P))
+            return -50;
         return 10;
     }
-    int32_t Insert(uint32_t block, uint32_t offset, FM_TagHdr *t, Addr *tag, Addr *data, Addr *next) {
-        if (block == 0 || (block == h.endBlock && offset == h.endOffset)) return Append(*t, tag, nullptr);
+    int32_t Insert(uint32_t block, uint32_t offset, FM_TagHdr *t, Addr *tag, Addr *data,
+                   Addr *next) {
+        if (block == 0 || (block == h.endBlock && offset == h.endOffset))
+            return Append(*t, tag, nullptr);
         FM_TagHdr found{};
         Addr follow{};
         int32_t s = ReadTag(block, offset, &found, nullptr, &follow);
@@ -298,7 +306,8 @@ class Model {
                 room += found.length;
                 if (follow.block == 0) break;
                 Addr after{};
-                if ((s = ReadTag(follow.block, follow.offset, &found, nullptr, &after)) < 0) return s;
+                if ((s = ReadTag(follow.block, follow.offset, &found, nullptr, &after)) < 0)
+                    return s;
                 if (found.kind != 0) break;
                 follow = after;
             }
@@ -336,7 +345,8 @@ class Model {
             if (follow.block == block) {
                 Bytes tail(P - follow.offset);
                 s = Move(false, block, follow.offset, int32_t(tail.size()), tail.data(), nullptr);
-                if (s >= 0) s = Move(true, last, follow.offset, int32_t(tail.size()), tail.data(), nullptr);
+                if (s >= 0)
+                    s = Move(true, last, follow.offset, int32_t(tail.size()), tail.data(), nullptr);
                 if (s < 0) return s;
                 if (!callback_) return -6;
                 Addr at = follow;
@@ -354,7 +364,8 @@ class Model {
                 follow.block = last;
             }
         }
-        if (uint64_t(room) >= uint64_t(t->length) + P && uint64_t(room) + offset >= 2ull * P + follow.offset) {
+        if (uint64_t(room) >= uint64_t(t->length) + P &&
+            uint64_t(room) + offset >= 2ull * P + follow.offset) {
             uint32_t excess = room - t->length;
             uint32_t b = 0;
             if ((s = Word(block, 0, &b)) < 0) return s;
@@ -456,7 +467,8 @@ class Model {
     }
     void WriteHeader() {
         uint8_t b[36] = {0x54, 0x5E, 0xD8, 0x07};
-        const uint32_t w[8] = {h.payload, h.stride, h.nextIndex, h.first, h.last, h.freeHead, h.endBlock, h.endOffset};
+        const uint32_t w[8] = {h.payload, h.stride,   h.nextIndex, h.first,
+                               h.last,    h.freeHead, h.endBlock,  h.endOffset};
         for (int i = 0; i < 8; ++i) Put32(b + 4 + 4 * i, w[i]);
         Write(0, b, 36);
     }
@@ -569,7 +581,8 @@ View ViewOf(const Model &m) {
 
 View ViewOf(const FM_BlockFile *f, const std::string &path) {
     const FM_BlockFileHdr &x = f->header;
-    View v{{x.payloadSize, x.stride, x.nextIndex, x.firstBlock, x.lastBlock, x.freeHead, x.endBlock, x.endOffset},
+    View v{{x.payloadSize, x.stride, x.nextIndex, x.firstBlock, x.lastBlock, x.freeHead, x.endBlock,
+            x.endOffset},
            {},
            {},
            f->cachedCount,
@@ -599,7 +612,8 @@ void ExpectSame(const View &real, const View &model, const std::string &where) {
     EXPECT_EQ(real.counted, model.counted);
     EXPECT_EQ(real.order, model.order) << "cache order and dirty marks";
     EXPECT_TRUE(real.images == model.images) << "cache images";
-    EXPECT_TRUE(real.disk == model.disk) << "file bytes (" << real.disk.size() << " vs " << model.disk.size() << ")";
+    EXPECT_TRUE(real.disk == model.disk)
+        << "file bytes (" << real.disk.size() << " vs " << model.disk.size() << ")";
     const auto rs = real.Stream(), ms = model.Stream();
     EXPECT_EQ(Describe(rs), Describe(ms)) << "tag stream";
     EXPECT_EQ(real.FirstTags(), model.FirstTags()) << "firstTag of each block";
@@ -629,7 +643,9 @@ TEST_P(TagModelTest, RandomSequenceFollowsTheRules) {
     const Config c = GetParam();
     const std::string path = Path("m.blk");
     std::mt19937 rng(c.seed * 7919u + c.payload * 31u + c.limit);
-    auto pick = [&](uint32_t lo, uint32_t hi) { return std::uniform_int_distribution<uint32_t>(lo, hi)(rng); };
+    auto pick = [&](uint32_t lo, uint32_t hi) {
+        return std::uniform_int_distribution<uint32_t>(lo, hi)(rng);
+    };
     const uint32_t P = c.payload;
 
     g_calls = Calls{};
@@ -647,7 +663,8 @@ TEST_P(TagModelTest, RandomSequenceFollowsTheRules) {
         steps = step;
         const auto stream = ViewOf(model).Stream();
         std::vector<size_t> live, freeTags;
-        for (size_t i = 0; i < stream.size(); ++i) (stream[i].tag.kind ? live : freeTags).push_back(i);
+        for (size_t i = 0; i < stream.size(); ++i)
+            (stream[i].tag.kind ? live : freeTags).push_back(i);
         const uint32_t roll = pick(0, 99);
         g_calls.answer = modelCalls.answer = pick(0, 99) < 4 ? -7 : 10;
         std::ostringstream what;
@@ -657,7 +674,7 @@ TEST_P(TagModelTest, RandomSequenceFollowsTheRules) {
 
         // Longest append that the chain rules keep readable.
         const auto &mh = model.h;
-        const uint32_t saneAppend = mh.endBlock == 0 ? P
+        const uint32_t saneAppend = mh.endBlock == 0         ? P
                                     : mh.endBlock == mh.last ? 2 * P - mh.endOffset
                                                              : P - mh.endOffset;
         // Nor may it fill a block exactly: an end position of block 0 sends
@@ -687,12 +704,16 @@ TEST_P(TagModelTest, RandomSequenceFollowsTheRules) {
         } else if (roll < 60 && !freeTags.empty()) {
             const size_t i = freeTags[pick(0, uint32_t(freeTags.size() - 1))];
             uint32_t room = 0;
-            for (size_t j = i; j < stream.size() && stream[j].tag.kind == 0; ++j) room += stream[j].tag.length;
+            for (size_t j = i; j < stream.size() && stream[j].tag.kind == 0; ++j)
+                room += stream[j].tag.length;
             const uint32_t r = pick(0, 9);
-            uint32_t length = r < 6 ? pick(8, std::max(8u, room)) : r < 8 ? room + P * pick(1, 2) : pick(8, 2 * P);
+            uint32_t length = r < 6   ? pick(8, std::max(8u, room))
+                              : r < 8 ? room + P * pick(1, 2)
+                                      : pick(8, 2 * P);
             rt = mt = Tag(uint8_t(pick(1, 255)), length);
             what << "insert at free " << stream[i].at << " room " << room << " length " << length;
-            rs = FM_TagInsertHdrAt(file, stream[i].at.block, stream[i].at.offset, &rt, &ra[0], &ra[1], &ra[2]);
+            rs = FM_TagInsertHdrAt(file, stream[i].at.block, stream[i].at.offset, &rt, &ra[0],
+                                   &ra[1], &ra[2]);
             ms = model.Insert(stream[i].at.block, stream[i].at.offset, &mt, &ma[0], &ma[1], &ma[2]);
         } else if (roll < 80 && !stream.empty() &&
                    !(c.sane && stream.back().at.offset == 0 && stream.size() > 1)) {
@@ -703,7 +724,8 @@ TEST_P(TagModelTest, RandomSequenceFollowsTheRules) {
         } else if (roll < 88 && !stream.empty()) {
             const auto &e = stream[pick(0, uint32_t(stream.size() - 1))];
             uint32_t length = pick(8, P);
-            if (c.sane) length = std::max(8u, readable(std::min(length, P - e.at.offset), e.at.offset));
+            if (c.sane)
+                length = std::max(8u, readable(std::min(length, P - e.at.offset), e.at.offset));
             rt = mt = Tag(uint8_t(pick(1, 255)), length);
             what << "rewrite " << e.at << " length " << rt.length;
             rs = FM_TagRewriteHdr(file, e.at.block, e.at.offset, &rt, &ra[0], &ra[1], &ra[2]);
@@ -718,8 +740,10 @@ TEST_P(TagModelTest, RandomSequenceFollowsTheRules) {
             ms = model.NextAddr(e.at.block, e.at.offset, 8, &ma[0]);
             if (!TS_FAILED(rs) && ra[0].block != 0) {
                 Bytes copy = data;
-                rs = FM_BlockWrite(file, ra[0].block, ra[0].offset, int32_t(data.size()), data.data(), &ra[1]);
-                ms = model.Move(true, ma[0].block, ma[0].offset, int32_t(copy.size()), copy.data(), &ma[1]);
+                rs = FM_BlockWrite(file, ra[0].block, ra[0].offset, int32_t(data.size()),
+                                   data.data(), &ra[1]);
+                ms = model.Move(true, ma[0].block, ma[0].offset, int32_t(copy.size()), copy.data(),
+                                &ma[1]);
             }
         } else if (roll < 97) {
             const uint32_t index = pick(1, std::max(1u, model.h.nextIndex));
@@ -750,7 +774,9 @@ TEST_P(TagModelTest, RandomSequenceFollowsTheRules) {
         if (TS_FAILED(rs) && StatusOf(rs) != -4) intact = false;
         if (model.h.endBlock == 0 && model.h.first != 0) intact = false;
         if (intact) ++intactSteps;
-        if (getenv("TAGMODEL_STATS")) fprintf(stderr, "%s -> %d blocks %u stream %zu calls %zu\n", what.str().c_str(), StatusOf(rs), model.h.nextIndex, stream.size(), g_calls.list.size());
+        if (getenv("TAGMODEL_STATS"))
+            fprintf(stderr, "%s -> %d blocks %u stream %zu calls %zu\n", what.str().c_str(),
+                    StatusOf(rs), model.h.nextIndex, stream.size(), g_calls.list.size());
         for (int i = 0; i < 3; ++i) EXPECT_EQ(ra[i], ma[i]) << "out " << i;
         EXPECT_EQ(rt.length, mt.length);
         EXPECT_EQ(g_calls.list, modelCalls.list) << "callback calls";
@@ -778,7 +804,8 @@ std::vector<Config> Configs() {
 INSTANTIATE_TEST_SUITE_P(Sequences, TagModelTest, ::testing::ValuesIn(Configs()),
                          [](const ::testing::TestParamInfo<Config> &i) {
                              return "payload" + std::to_string(i.param.payload) + "_limit" +
-                                    std::to_string(i.param.limit) + "_seed" + std::to_string(i.param.seed) +
+                                    std::to_string(i.param.limit) + "_seed" +
+                                    std::to_string(i.param.seed) +
                                     (i.param.sane ? "_readable" : "_any");
                          });
 

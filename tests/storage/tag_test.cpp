@@ -337,8 +337,8 @@ TEST_F(TagTest, InsertIntoLargeFreeSpaceGivesWholeFreeBlocksBack) {
     EXPECT_EQ(Walk(), (Tags{{1, 20}, {0, 100}, {0, 100}, {2, 20}}));
     FM_TagHdr small = Tag(4, 20);
     FM_BlockAddr next{};
-    ASSERT_EQ(StatusOf(FM_TagInsertHdrAt(file_, n.block, n.offset, &small, nullptr, nullptr, &next)),
-              10);
+    ASSERT_EQ(
+        StatusOf(FM_TagInsertHdrAt(file_, n.block, n.offset, &small, nullptr, nullptr, &next)), 10);
     EXPECT_EQ(next, (FM_BlockAddr{3, 20}));
     EXPECT_EQ(file_->header.freeHead, 2u);
     EXPECT_EQ(Hdr(1).next, 3u);

@@ -26,7 +26,8 @@ void PrintStream(FM_BlockFile *file) {
         FM_TagHdr tag;
         FM_BlockAddr next;
         if (TS_FAILED(FM_TagReadHdr(file, at.block, at.offset, &tag, nullptr, &next))) break;
-        std::printf(" [%s %u at (%u, %u)]", tag.kind ? "tag" : "free", tag.length, at.block, at.offset);
+        std::printf(" [%s %u at (%u, %u)]", tag.kind ? "tag" : "free", tag.length, at.block,
+                    at.offset);
         at = next;
     }
     std::printf("\n");
