@@ -136,6 +136,116 @@ TESSARINE_API int32_t HVT_SaveBlockWithBitShift(uint8_t sub, HVT_FileInfo *info,
                                                 const void *buffer);
 TESSARINE_API int32_t HVT_ReadBlockWithBitShift(uint8_t sub, HVT_FileInfo *info,
                                                 const HVT_Box *box, int32_t stride, void *buffer);
+/* ---- Block file and tag layer ----------------------------------------------
+   A file of fixed-size slots: slot 0 holds the 36-byte header, slot i >= 1
+   holds block i (a 12-byte block header, then payloadSize data bytes). All
+   on-disk words are 32-bit little-endian; the records below give the field
+   order and are read and written field by field. */
+
+/* First four bytes of every block file. */
+#define FM_BLOCKFILE_MAGIC0 0x54u
+#define FM_BLOCKFILE_MAGIC1 0x5Eu
+#define FM_BLOCKFILE_MAGIC2 0xD8u
+#define FM_BLOCKFILE_MAGIC3 0x07u
+#define FM_BLOCKFILE_HDR_BYTES 36u
+#define FM_BLOCK_HDR_BYTES 12u
+#define FM_TAG_HDR_BYTES 8u
+/* Size of the path field of FM_BlockFile; a path must be shorter. */
+#define FM_BLOCKFILE_PATH_BYTES 512
+
+/* File header, at byte 0 (36 bytes). */
+typedef struct FM_BlockFileHdr {
+    uint8_t magic[4];
+    uint32_t payloadSize; /* data bytes in a block */
+    uint32_t stride;      /* payloadSize + 12: file distance between blocks */
+    uint32_t nextIndex;   /* index the next block taken from the end gets */
+    uint32_t firstBlock;  /* 0 = empty chain */
+    uint32_t lastBlock;
+    uint32_t freeHead;    /* first block of the free list, 0 = none */
+    uint32_t endBlock;    /* append position of the tags; 0 = take a new block */
+    uint32_t endOffset;
+} FM_BlockFileHdr;
+
+/* Block header, at the start of every block (12 bytes). */
+typedef struct FM_BlockHdr {
+    uint32_t next;     /* next in the chain; on the free list, the next free block */
+    uint32_t prev;
+    uint32_t firstTag; /* offset of the first tag starting here; payloadSize if none */
+} FM_BlockHdr;
+
+/* Tag header, in the tag stream (8 bytes). kind 0 is free space. */
+typedef struct FM_TagHdr {
+    uint8_t kind;
+    uint8_t extra[3]; /* the caller's; carried along */
+    uint32_t length;  /* the whole tag, these 8 bytes included */
+} FM_TagHdr;
+
+/* A position in the chain; block 0 is past the end. */
+typedef struct FM_BlockAddr {
+    uint32_t block;
+    uint32_t offset;
+} FM_BlockAddr;
+
+/* Told when an insert moves a tag to another block; a negative status stops
+   the move. */
+typedef int32_t (*FM_TagCallback)(FM_BlockAddr *oldAddress, FM_BlockAddr *newAddress);
+
+/* A cache node: a node of a circular list (its head is laid out as ListNode),
+   then the block image of `stride` bytes. nodeBytes is
+   offsetof(FM_MemBlock, image) + stride. */
+typedef struct FM_MemBlock {
+    uintptr_t dirty;           /* non-zero: written back on eviction and close */
+    struct FM_MemBlock *next;  /* towards older */
+    struct FM_MemBlock *prev;  /* towards newer; the head's prev is the oldest */
+    uint32_t index;            /* block held here */
+    uint8_t image[];           /* FM_BlockHdr then the data, as in the file */
+} FM_MemBlock;
+
+/* An open block file. */
+typedef struct FM_BlockFile {
+    char path[FM_BLOCKFILE_PATH_BYTES];
+    int32_t descriptor; /* -1 = none */
+    uint32_t nodeBytes;
+    uint8_t cacheLimit;
+    uint32_t cachedCount;
+    FM_MemBlock *cacheHead; /* most recently used */
+    FM_TagCallback tagCallback;
+    FM_BlockFileHdr header; /* written back at close */
+} FM_BlockFile;
+
+TESSARINE_API int32_t FM_BlockFileCreate(const char *path, FM_BlockFile **file,
+                                         uint32_t payloadSize, uint8_t cacheLimit,
+                                         FM_TagCallback tagCallback);
+TESSARINE_API int32_t FM_BlockFileOpen(const char *path, FM_BlockFile **file, uint8_t cacheLimit);
+TESSARINE_API int32_t FM_BlockFileClose(FM_BlockFile **file);
+TESSARINE_API void FM_BlockFileDelete(FM_BlockFile **file);
+TESSARINE_API int32_t FM_NewBlock(FM_BlockFile *file, FM_MemBlock **node);
+TESSARINE_API int32_t FM_FreeBlock(FM_BlockFile *file, uint32_t index);
+TESSARINE_API int32_t FM_InsertBlockAfter(FM_BlockFile *file, uint32_t after, FM_MemBlock *node);
+TESSARINE_API int32_t FM_GetFileBlockHdrByIndex(FM_BlockFile *file, uint32_t index,
+                                                FM_BlockHdr *header);
+TESSARINE_API int32_t FM_GetMemBlockByIndex(FM_BlockFile *file, uint32_t index,
+                                            FM_MemBlock **node);
+TESSARINE_API int32_t FM_GetNextAddr(FM_BlockFile *file, uint32_t block, uint32_t offset,
+                                     uint32_t distance, FM_BlockAddr *result);
+TESSARINE_API int32_t FM_BlockRead(FM_BlockFile *file, uint32_t block, uint32_t offset,
+                                   int32_t count, void *buffer, FM_BlockAddr *last);
+TESSARINE_API int32_t FM_BlockWrite(FM_BlockFile *file, uint32_t block, uint32_t offset,
+                                    int32_t count, const void *buffer, FM_BlockAddr *last);
+
+TESSARINE_API int32_t FM_TagReadHdr(FM_BlockFile *file, uint32_t block, uint32_t offset,
+                                    FM_TagHdr *header, FM_BlockAddr *data, FM_BlockAddr *next);
+TESSARINE_API int32_t FM_TagAppendHdrAtEnd(FM_BlockFile *file, const FM_TagHdr *header,
+                                           FM_BlockAddr *tag, FM_BlockAddr *data);
+TESSARINE_API int32_t FM_TagInsertHdrAt(FM_BlockFile *file, uint32_t block, uint32_t offset,
+                                        FM_TagHdr *header, FM_BlockAddr *tag,
+                                        FM_BlockAddr *data, FM_BlockAddr *next);
+TESSARINE_API int32_t FM_TagDelete(FM_BlockFile *file, const FM_BlockAddr *tag,
+                                   FM_BlockAddr *next);
+TESSARINE_API int32_t FM_TagRewriteHdr(FM_BlockFile *file, uint32_t block, uint32_t offset,
+                                       FM_TagHdr *header, FM_BlockAddr *tag,
+                                       FM_BlockAddr *data, FM_BlockAddr *next);
+TESSARINE_API int32_t FM_DupTagBlockFile(const char *sourcePath, const char *destinationPath);
 
 TESSARINE_END_C
 

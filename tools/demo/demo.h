@@ -8,3 +8,4 @@ void DemoCore();
 void DemoGeometry();
 void DemoColor();
 void DemoTiles();
+void DemoBlockFile();

@@ -66,5 +66,6 @@ int main() {
     DemoGeometry();
     DemoColor();
     DemoTiles();
+    DemoBlockFile();
     return 0;
 }
