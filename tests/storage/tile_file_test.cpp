@@ -27,8 +27,8 @@ class TileFileTest : public tstest::Sandbox {
                    int32_t count = 0, const uint8_t *colors = nullptr, uint8_t user1 = 9) {
         path_[0] = '\0';
         fd_ = -1;
-        return HVT_CreateBlankTileBmpFile(2, bpp, width, height, 300.0, 150.0, model, count,
-                                          colors, path_, &fd_, user1, 8, 7);
+        return HVT_CreateBlankTileBmpFile(2, bpp, width, height, 300.0, 150.0, model, count, colors,
+                                          path_, &fd_, user1, 8, 7);
     }
     void Remove() {
         if (fd_ > 0) FM_Close(fd_);
@@ -90,7 +90,7 @@ TEST_F(TileFileTest, HundredByHundredAtEightBitsIsByteExact) {
     EXPECT_EQ(I32(b, 108), 100);
     EXPECT_EQ(I32(b, 112), 100);
     EXPECT_EQ(b[116 + 10000], '.');
-    struct stat st{};
+    struct stat st {};
     ASSERT_EQ(::stat(path_, &st), 0);
     EXPECT_EQ(st.st_mode & 0777, 0600u);
 }
@@ -222,7 +222,7 @@ TEST_F(TileFileTest, EndOffsetPastThirtyTwoBitsIsMinus40ByAnyAmount) {
     edge.subbmpOffset[edge.subbmpCount] = static_cast<int32_t>(INT32_MAX - 16 - 20 - height);
     EXPECT_EQ(HVT_AddSubbmp(fd_, &edge, 1, height, nullptr, nullptr), TS_OK);
     EXPECT_EQ(edge.subbmpOffset[2], INT32_MAX);
-    struct stat st{};
+    struct stat st {};
     ASSERT_EQ(::fstat(fd_, &st), 0);
     EXPECT_EQ(st.st_size, int64_t{INT32_MAX} + 1);
 }
@@ -302,7 +302,9 @@ TEST_F(TileFileTest, AddSubbmpFailuresLeaveTheHeaderAsStated) {
     tstest::ForEachAllocationFailure([&](int64_t) {
         HVT_FileHeader h = start;
         const int32_t s = HVT_AddSubbmp(fd_, &h, 20, 20, nullptr, nullptr);
-        if (tessarine::testing::AllocationFailureHit()) EXPECT_EQ(s, -5);
+        if (tessarine::testing::AllocationFailureHit()) {
+            EXPECT_EQ(s, -5);
+        }
     });
 }
 
@@ -394,9 +396,9 @@ TEST_F(TileOpenTest, HostileHeadersAreRefusedAndTheRecordClosed) {
         int32_t status;
     };
     const Case cases[] = {
-        {37, {10}, -50},                 // sub-bitmap count above 9
-        {28, {1}, -50},                  // colour count set below: does not fit the file
-        {28, {7}, -2},                   // colour count with an unknown model
+        {37, {10}, -50},                      // sub-bitmap count above 9
+        {28, {1}, -50},                       // colour count set below: does not fit the file
+        {28, {7}, -2},                        // colour count with an unknown model
         {40, {0xF0, 0xFF, 0xFF, 0xFF}, -50},  // negative sub-bitmap offset
     };
     const auto original = FileBytes(path_);
@@ -458,13 +460,20 @@ TEST_F(TileOpenTest, FailuresAtEveryCallCloseTheRecord) {
                   attempt([] { return tessarine::testing::AllocationFailureHit(); }, -5);
               }),
               3);
-    EXPECT_EQ(tstest::ForEachFileFailure(FileCall::Read, [&](int64_t) {
-                  attempt([] { return tessarine::testing::FileFailureHit(FileCall::Read); }, -50);
-              }),
-              4) << "header, colour table, two sub-bitmap headers";
-    EXPECT_EQ(tstest::ForEachFileFailure(FileCall::Seek, [&](int64_t) {
-                  attempt([] { return tessarine::testing::FileFailureHit(FileCall::Seek); }, -50);
-              }),
+    EXPECT_EQ(tstest::ForEachFileFailure(
+                  FileCall::Read,
+                  [&](int64_t) {
+                      attempt([] { return tessarine::testing::FileFailureHit(FileCall::Read); },
+                              -50);
+                  }),
+              4)
+        << "header, colour table, two sub-bitmap headers";
+    EXPECT_EQ(tstest::ForEachFileFailure(
+                  FileCall::Seek,
+                  [&](int64_t) {
+                      attempt([] { return tessarine::testing::FileFailureHit(FileCall::Seek); },
+                              -50);
+                  }),
               3);
 }
 
@@ -515,7 +524,9 @@ TEST_F(TileFileTest, TileTableFailures) {
     for (FileCall kind : {FileCall::Read, FileCall::Seek}) {
         tstest::ForEachFileFailure(kind, [&](int64_t) {
             const int32_t s = HVT_GetSubbmpTileHdrs(0, info);
-            if (tessarine::testing::FileFailureHit(kind)) EXPECT_EQ(s, -50);
+            if (tessarine::testing::FileFailureHit(kind)) {
+                EXPECT_EQ(s, -50);
+            }
             drop();
         });
     }
@@ -573,13 +584,17 @@ TEST_F(TileFileTest, TileRowsAreWrittenAndReadWhole) {
     for (FileCall kind : {FileCall::Read, FileCall::Seek}) {
         tstest::ForEachFileFailure(kind, [&](int64_t) {
             const int32_t s = HVT_ReadTile(0, f.Info(), 0, 0, 2, back);
-            if (tessarine::testing::FileFailureHit(kind)) EXPECT_EQ(s, -50);
+            if (tessarine::testing::FileFailureHit(kind)) {
+                EXPECT_EQ(s, -50);
+            }
         });
     }
     for (FileCall kind : {FileCall::Write, FileCall::Seek}) {
         tstest::ForEachFileFailure(kind, [&](int64_t) {
             const int32_t s = HVT_SaveTile(0, f.Info(), 0, 0, 2, rows);
-            if (tessarine::testing::FileFailureHit(kind)) EXPECT_EQ(s, -50);
+            if (tessarine::testing::FileFailureHit(kind)) {
+                EXPECT_EQ(s, -50);
+            }
         });
     }
 }
