@@ -245,3 +245,59 @@ TEST(GeometryRecords, Layout) {
     static_assert(offsetof(BZ_SortEntry, tag) == 8);
     SUCCEED();
 }
+
+TEST(GeometryCurveEval, ChordTableBoundaries) {
+    // A curve 1e-5 across: its speed stays below 1e-4, so every tangent comes
+    // from a chord, and the chords of the four ranges of t point differently.
+    const double s = 1e-5;
+    const double c[8] = {0, 0, s, 0, s, s, 0, s};
+    double k[8];
+    Bezier(c, k);
+    auto point = [&](double t) {
+        return Pt(((k[0] * t + k[2]) * t + k[4]) * t + k[6],
+                  ((k[1] * t + k[3]) * t + k[5]) * t + k[7]);
+    };
+    auto chord = [](const BZ_Point &from, const BZ_Point &to) {
+        BZ_Point v;
+        EXPECT_EQ(BZ_GetNormVector(from.x, from.y, to.x, to.y, &v), 10);
+        return v;
+    };
+    const BZ_Point p1{s, 0}, p2{s, s};
+    struct Case {
+        double t;
+        BZ_Point from, to;
+    };
+    const Case cases[] = {
+        {0.00009, point(0.00009), p1},  // below 0.0001: P to p1
+        {0.0001, point(0.0001), p2},    // from 0.0001: P to p2
+        {0.49999, point(0.49999), p2},
+        {0.5, p1, point(0.5)},          // from 0.5: p1 to P
+        {0.9999, p1, point(0.9999)},    // 0.9999 still belongs to it
+        {0.99991, p2, point(0.99991)},  // above 0.9999: p2 to P
+    };
+    for (const Case &cs : cases) {
+        double x = kSentinel, y = kSentinel;
+        EXPECT_EQ(BZ_CurveEval(c[0], c[1], c[2], c[3], c[4], c[5], c[6], c[7], nullptr, cs.t, 1,
+                               &x, &y),
+                  10)
+            << "t " << cs.t;
+        const BZ_Point v = chord(cs.from, cs.to);
+        EXPECT_EQ(x, v.x) << "t " << cs.t;
+        EXPECT_EQ(y, v.y) << "t " << cs.t;
+    }
+}
+
+TEST(GeometryArcEval, MarginBoundsAreInclusiveAndSnapIsStrict) {
+    // t = -0.0001 is not below -0.0001: accepted, and not snapped to 0.
+    double x = kSentinel, y = kSentinel;
+    EXPECT_EQ(BZ_ArcEval(0, 0, 1, 0.3, 1.0, -0.0001, 0, &x, &y), 10);
+    double s, c;
+    GetSinCos(1.0 * -0.0001 + 0.3, &s, &c);
+    EXPECT_EQ(x, c * 1 + 0);
+    EXPECT_EQ(y, s * 1 + 0);
+    // t = 0.0001 is not below 0.0001 in magnitude: evaluated as it is.
+    EXPECT_EQ(BZ_ArcEval(0, 0, 1, 0.3, 1.0, 0.0001, 0, &x, &y), 10);
+    GetSinCos(1.0 * 0.0001 + 0.3, &s, &c);
+    EXPECT_EQ(x, c);
+    EXPECT_EQ(y, s);
+}
