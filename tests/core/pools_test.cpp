@@ -406,6 +406,32 @@ TEST_F(NodePool, OverflowingBlockFailsWithoutAllocating) {
     MGR_ListEnd(&pool);
 }
 
+TEST_F(NodePool, NodesTooSmallForTheirLinksAreRefused) {
+    MGR_List pool;
+    MGR_ListInit(&pool, sizeof(ListNode) - 1, 4);
+    tessarine::testing::ResetInjection();
+    void *node = kUntouched;
+    EXPECT_EQ(MGR_ListAlloc(&pool, &node), -4);
+    EXPECT_EQ(node, kUntouched);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 0);
+    EXPECT_EQ(pool.blocks, nullptr);
+    // Not even from a block made by a reset.
+    EXPECT_EQ(MGR_ListResetOneBlock(&pool), 10);
+    EXPECT_EQ(MGR_ListAlloc(&pool, &node), -4);
+    EXPECT_EQ(node, kUntouched);
+    EXPECT_EQ(pool.usedInCurrent, 0);
+    MGR_ListEnd(&pool);
+    MGR_ListInit(&pool, sizeof(Record), 0);
+    EXPECT_EQ(MGR_ListAlloc(&pool, &node), -4);
+    EXPECT_EQ(node, kUntouched);
+    EXPECT_EQ(pool.blocks, nullptr);
+    // Exactly a list node is enough.
+    MGR_ListInit(&pool, sizeof(ListNode), 1);
+    ASSERT_EQ(MGR_ListAlloc(&pool, &node), 10);
+    MGR_ListFree(&pool, &node);
+    MGR_ListEnd(&pool);
+}
+
 TEST_F(NodePool, AllocAllocationFailure) {
     tstest::OutOfMemoryRecorder hook;
     const int64_t allocations = tstest::ForEachAllocationFailure([&](int64_t n) {
