@@ -54,7 +54,9 @@ TESSARINE_API int32_t ListInsertAfter(ListNode *node, ListNode **cursor) {
     return kOk;
 }
 
+// A null node has no links to set: refused rather than written through.
 TESSARINE_API int32_t ListInsertSort(ListCompareFn compare, ListNode *node, ListNode **head) {
+    if (node == nullptr) return kErrArgument;
     if (*head == nullptr) {
         SelfLink(node);
         *head = node;

@@ -5,6 +5,7 @@
 #include "core/pool_blocks.h"
 #include "core/status.h"
 
+using tessarine::kErrArgument;
 using tessarine::kErrMemory;
 using tessarine::kOk;
 
@@ -42,6 +43,9 @@ TESSARINE_API int32_t MGR_ListAlloc(MGR_List *pool, void **node) {
         *node = reused;
         return kOk;
     }
+    // A fresh node must hold the links that MGR_ListFree threads through it.
+    if (pool->perBlock == 0 || pool->elementSize < static_cast<int32_t>(sizeof(ListNode)))
+        return kErrArgument;
     if (pool->current == nullptr || pool->usedInCurrent >= pool->perBlock) {
         const int32_t status = NewBlock(pool);
         if (status < 0) return status;

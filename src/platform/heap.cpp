@@ -33,6 +33,7 @@ struct MoveableRecord {
 };
 
 std::atomic<int64_t> g_liveBlocks{0};
+std::atomic<uint32_t> g_lastAllocFlags{0};
 
 FixedHeader *FixedHeaderOf(MEM_Handle block) {
     auto *header = reinterpret_cast<FixedHeader *>(static_cast<unsigned char *>(block) -
@@ -131,6 +132,7 @@ MEM_Handle ResizeFixed(FixedHeader *header, size_t bytes, uint32_t flags) {
 bool IsMoveable(MEM_Handle block) { return (reinterpret_cast<uintptr_t>(block) & 1u) != 0; }
 
 MEM_Handle GlobalAlloc(uint32_t flags, size_t bytes) {
+    g_lastAllocFlags = flags;
     return (flags & GMEM_MOVEABLE) ? AllocMoveable(flags, bytes) : AllocFixed(flags, bytes);
 }
 
@@ -193,4 +195,5 @@ MEM_Handle GlobalFree(MEM_Handle block) {
 
 namespace tessarine::testing {
 int64_t LiveBlocks() { return platform::g_liveBlocks; }
+uint32_t LastGlobalAllocFlags() { return platform::g_lastAllocFlags; }
 }  // namespace tessarine::testing

@@ -17,6 +17,8 @@ int64_t AllocationCount();
 bool AllocationFailureHit();
 // Blocks and handles now alive in the heap.
 int64_t LiveBlocks();
+// The flag word of the latest GlobalAlloc call, whether it failed or not.
+uint32_t LastGlobalAllocFlags();
 
 enum class FileCall { Read, Write, Seek };
 // Make the Nth call of that kind from now fail with EIO; 0 turns it off.

@@ -202,6 +202,18 @@ TEST_P(Sizes, InsertSortReadsOnlyTheLowSixteenBits) {
     EXPECT_EQ(h, again[n]);  // 0x8000 is negative: goes in front of the head
 }
 
+TEST_P(Sizes, InsertSortRefusesANullNode) {
+    const int n = GetParam();
+    Nodes nodes(n);
+    ListNode *head = nodes.List(n);
+    ListNode *const before = head;
+    g_compareCalls = 0;
+    EXPECT_EQ(ListInsertSort(AlwaysZero, nullptr, &head), -4);
+    EXPECT_EQ(head, before);
+    EXPECT_EQ(g_compareCalls, 0);
+    EXPECT_EQ(Walk(head), Range(0, n));
+}
+
 TEST_P(Sizes, ConnectJoinsBehindTheEnd) {
     const int n = GetParam();
     for (int m : {1, 2, 3}) {

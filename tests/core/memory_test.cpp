@@ -15,6 +15,7 @@ namespace {
 
 using tessarine::platform::IsMoveable;
 using tessarine::testing::AllocationFailureHit;
+using tessarine::testing::LastGlobalAllocFlags;
 using tessarine::testing::LiveBlocks;
 
 class Memory : public tstest::Sandbox {};
@@ -54,6 +55,43 @@ TEST_F(Memory, AllocPtrGivesFixedBlocks) {
         }
         EXPECT_EQ(MEM_FreePtr(p), nullptr);
     }
+}
+
+// The heap sees the platform's flag words: moveable 0x2, discardable 0x100
+// on top of it, zero fill 0x40; bit 1 means nothing to either allocator.
+TEST_F(Memory, AllocFlagsReachTheHeapAsPlatformWords) {
+    const struct {
+        uint32_t flags, handleWord, pointerWord;
+    } cases[] = {{0, 0x002, 0x00}, {1, 0x002, 0x00}, {2, 0x102, 0x00},
+                 {4, 0x042, 0x40}, {6, 0x142, 0x40}, {7, 0x142, 0x40}};
+    for (const auto &c : cases) {
+        MEM_Handle h = MEM_AllocHdl(c.flags, 16);
+        EXPECT_EQ(LastGlobalAllocFlags(), c.handleWord) << c.flags;
+        MEM_FreeHdl(h);
+        void *p = MEM_AllocPtr(c.flags, 16);
+        EXPECT_EQ(LastGlobalAllocFlags(), c.pointerWord) << c.flags;
+        MEM_FreePtr(p);
+    }
+    MEM_Handle h = MEM_ReallocHdl(nullptr, 8);
+    EXPECT_EQ(LastGlobalAllocFlags(), 0x002u);
+    MEM_FreeHdl(h);
+    void *p = MEM_ReallocPtr(nullptr, 8);
+    EXPECT_EQ(LastGlobalAllocFlags(), 0x000u);
+    // The fall-back blocks of a failed resize: fixed for a pointer, plain
+    // moveable for a handle whatever it was made with.
+    h = MEM_AllocHdl(MEM_FLAG_DISCARDABLE | MEM_FLAG_ZERO, 8);
+    EXPECT_EQ(LastGlobalAllocFlags(), 0x142u);
+    tessarine::testing::FailAllocationAt(1);
+    p = MEM_ReallocPtr(p, 64);
+    EXPECT_TRUE(AllocationFailureHit());
+    EXPECT_EQ(LastGlobalAllocFlags(), 0x000u);
+    tessarine::testing::FailAllocationAt(1);
+    h = MEM_ReallocHdl(h, 64);
+    EXPECT_TRUE(AllocationFailureHit());
+    EXPECT_EQ(LastGlobalAllocFlags(), 0x002u);
+    tessarine::testing::ResetInjection();
+    MEM_FreeHdl(h);
+    MEM_FreePtr(p);
 }
 
 TEST_F(Memory, FreePtrAndFreeHdlTakeEitherKind) {
@@ -219,6 +257,26 @@ TEST_F(Memory, ReallocPtrAllocationFailureAtEachStep) {
     EXPECT_EQ(MEM_ReallocPtr(moved, 9000), nullptr);
     tessarine::testing::ResetInjection();
     EXPECT_EQ(hook.Calls(), std::vector<uint32_t>({9000u}));
+    EXPECT_EQ(LiveBlocks(), live - 1);
+}
+
+int64_t g_liveWhenHookRan = -1;
+int32_t NoteLiveBlocks(uint32_t) {
+    g_liveWhenHookRan = LiveBlocks();
+    return 0;
+}
+
+// The hook hears of the failure while the old block still exists.
+TEST_F(Memory, ReallocPtrCallsTheHookBeforeFreeingTheOldBlock) {
+    void *p = MEM_AllocPtr(0, 6);
+    const int64_t live = LiveBlocks();
+    const TS_NewMemoryHandlerFn previous = TS_SetNewMemoryHandler(NoteLiveBlocks);
+    g_liveWhenHookRan = -1;
+    tessarine::testing::FailAllocationsFrom(1);
+    EXPECT_EQ(MEM_ReallocPtr(p, 9000), nullptr);
+    tessarine::testing::ResetInjection();
+    TS_SetNewMemoryHandler(previous);
+    EXPECT_EQ(g_liveWhenHookRan, live);
     EXPECT_EQ(LiveBlocks(), live - 1);
 }
 

@@ -151,6 +151,7 @@ TEST(Distances, DistanceHasThreshold) {
 
 TEST(Distances, DistanceSquaredHasNone) {
     EXPECT_EQ(DistanceSQ(0, 0, 1e-9, 0), 1e-9 * 1e-9);
+    EXPECT_DOUBLE_EQ(DistanceSQ(0, 0, 1e-9, 0), 1e-18);
     EXPECT_NE(DistanceSQ(0, 0, 1e-9, 0), 0.0);
     EXPECT_EQ(DistanceSQ(0, 0, 3, 4), 25.0);
     EXPECT_EQ(BZ_Distptpts(1, 2, 4, 6), 25.0);

@@ -11,6 +11,7 @@
 
 namespace {
 
+using tessarine::testing::LastGlobalAllocFlags;
 using tessarine::testing::LiveBlocks;
 
 class DynamicArray : public tstest::Sandbox {};
@@ -54,6 +55,14 @@ TEST_F(DynamicArray, StartMakesZeroFilledLockedBlock) {
     MGR_DARYEnd(&a);
     EXPECT_EQ(a.handle, nullptr);
     EXPECT_EQ(a.base, nullptr);
+}
+
+TEST_F(DynamicArray, StartAsksForAZeroFilledMoveableBlock) {
+    MGR_DARY a;
+    MGR_DARYInit(&a);
+    ASSERT_EQ(MGR_DARYStart(&a, 4, 10), 10);
+    EXPECT_EQ(LastGlobalAllocFlags(), 0x42u);
+    MGR_DARYEnd(&a);
 }
 
 TEST_F(DynamicArray, FirstAllocGivesIndexOne) {
@@ -172,6 +181,7 @@ TEST_F(DynamicArray, GrowthPastInt32CapacityFails) {
 }
 
 TEST_F(DynamicArray, StartAllocationFailure) {
+    tstest::OutOfMemoryRecorder hook;  // the handle family never calls it
     tstest::ForEachAllocationFailure([](int64_t) {
         MGR_DARY a;
         MGR_DARYInit(&a);
@@ -185,6 +195,7 @@ TEST_F(DynamicArray, StartAllocationFailure) {
         }
         MGR_DARYEnd(&a);
     });
+    EXPECT_TRUE(hook.Calls().empty());
 }
 
 TEST_F(DynamicArray, ResizeInPlaceFailureFallsBackToAFreshBlock) {
@@ -204,6 +215,7 @@ TEST_F(DynamicArray, ResizeInPlaceFailureFallsBackToAFreshBlock) {
 }
 
 TEST_F(DynamicArray, ResizeFailureLosesTheBlock) {
+    tstest::OutOfMemoryRecorder hook;
     MGR_DARY a;
     MGR_DARYInit(&a);
     ASSERT_EQ(MGR_DARYStart(&a, 4, 10), 10);
@@ -214,6 +226,7 @@ TEST_F(DynamicArray, ResizeFailureLosesTheBlock) {
     EXPECT_EQ(a.handle, nullptr);
     EXPECT_EQ(a.base, nullptr);
     EXPECT_EQ(LiveBlocks(), live - 1);
+    EXPECT_TRUE(hook.Calls().empty());
     MGR_DARYEnd(&a);
 }
 
@@ -274,6 +287,21 @@ TEST_F(NodePool, CarvesBlocksOfPerBlockNodes) {
     EXPECT_EQ(pool.blocks, nullptr);
     EXPECT_EQ(pool.elementSize, static_cast<int32_t>(sizeof(Record)));
     EXPECT_NE(pool.current, nullptr);  // kept: the pool must be initialised again
+}
+
+// Each block: a zero-filled fixed list node first, then the fixed block.
+TEST_F(NodePool, BlockNodeIsZeroFilledAndTheBlockIsNot) {
+    MGR_List pool;
+    MGR_ListInit(&pool, sizeof(Record), 4);
+    void *node = kUntouched;
+    tessarine::testing::FailAllocationAt(1);
+    EXPECT_EQ(MGR_ListAlloc(&pool, &node), -5);
+    EXPECT_EQ(LastGlobalAllocFlags(), 0x40u);
+    tessarine::testing::FailAllocationAt(0);
+    ASSERT_EQ(MGR_ListAlloc(&pool, &node), 10);
+    EXPECT_EQ(LastGlobalAllocFlags(), 0x00u);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 2);
+    MGR_ListEnd(&pool);
 }
 
 TEST_F(NodePool, AllocAfterFreeGivesBackTheSameNode) {
@@ -379,6 +407,32 @@ TEST_F(NodePool, OverflowingBlockFailsWithoutAllocating) {
     EXPECT_EQ(MGR_ListAlloc(&pool, &node), -5);
     EXPECT_EQ(tessarine::testing::AllocationCount(), 0);
     EXPECT_EQ(pool.blocks, nullptr);
+    MGR_ListEnd(&pool);
+}
+
+TEST_F(NodePool, NodesTooSmallForTheirLinksAreRefused) {
+    MGR_List pool;
+    MGR_ListInit(&pool, sizeof(ListNode) - 1, 4);
+    tessarine::testing::ResetInjection();
+    void *node = kUntouched;
+    EXPECT_EQ(MGR_ListAlloc(&pool, &node), -4);
+    EXPECT_EQ(node, kUntouched);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 0);
+    EXPECT_EQ(pool.blocks, nullptr);
+    // Not even from a block made by a reset.
+    EXPECT_EQ(MGR_ListResetOneBlock(&pool), 10);
+    EXPECT_EQ(MGR_ListAlloc(&pool, &node), -4);
+    EXPECT_EQ(node, kUntouched);
+    EXPECT_EQ(pool.usedInCurrent, 0);
+    MGR_ListEnd(&pool);
+    MGR_ListInit(&pool, sizeof(Record), 0);
+    EXPECT_EQ(MGR_ListAlloc(&pool, &node), -4);
+    EXPECT_EQ(node, kUntouched);
+    EXPECT_EQ(pool.blocks, nullptr);
+    // Exactly a list node is enough.
+    MGR_ListInit(&pool, sizeof(ListNode), 1);
+    ASSERT_EQ(MGR_ListAlloc(&pool, &node), 10);
+    MGR_ListFree(&pool, &node);
     MGR_ListEnd(&pool);
 }
 
@@ -520,6 +574,20 @@ TEST_F(Arena, NonFittingLargeRequestKeepsTheTail) {
     EXPECT_EQ(c, static_cast<uint8_t *>(a) + 500);
     EXPECT_EQ(ListNumber(arena.blocks), 2);
     MGR_SMemReport(&arena);
+    MGR_SMemEnd(&arena);
+}
+
+TEST_F(Arena, BlockNodeIsZeroFilledAndTheBlockIsNot) {
+    MGR_SMem arena;
+    MSG_SMemInit(&arena, 100, 0);
+    void *piece = kUntouched;
+    tessarine::testing::FailAllocationAt(1);
+    EXPECT_EQ(MGR_SMemAlloc(&arena, 10, &piece), -5);
+    EXPECT_EQ(LastGlobalAllocFlags(), 0x40u);
+    tessarine::testing::FailAllocationAt(0);
+    ASSERT_EQ(MGR_SMemAlloc(&arena, 10, &piece), 10);
+    EXPECT_EQ(LastGlobalAllocFlags(), 0x00u);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 2);
     MGR_SMemEnd(&arena);
 }
 

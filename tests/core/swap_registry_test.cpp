@@ -50,6 +50,7 @@ int BeforeAnyRegistry() {
     if (MEM_RegisterSwapElement(5, nullptr) != -4) return 6;
     if (MEM_SqueezMemory(0) != -1) return 7;
     if (MEM_InitMemManager() != 10) return 8;
+    if (tessarine::testing::LastGlobalAllocFlags() != 0) return 11;  // a fixed block
     if (MEM_SqueezMemory(0) != 10) return 9;  // empty registry
     if (MEM_InitMemManager() != 10) return 10;
     return 0;
@@ -280,6 +281,11 @@ TEST_F(SwapRegistry, RegisterAllocationFailure) {
         }
     });
     EXPECT_EQ(n, 1);
+}
+
+TEST_F(SwapRegistry, SwapNodeIsAZeroFilledFixedBlock) {
+    Register(0xC1);
+    EXPECT_EQ(tessarine::testing::LastGlobalAllocFlags(), 0x40u);
 }
 
 TEST_F(SwapRegistry, InitAllocationFailureWhenPresentIsNone) {

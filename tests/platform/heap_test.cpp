@@ -52,6 +52,53 @@ TEST_F(Heap, ResizeKeepsContentsAndZeroFillsGrowth) {
     GlobalFree(h);
 }
 
+TEST_F(Heap, FixedBlockIsNeverDiscardedAndMovesOnlyWhenAllowed) {
+    MEM_Handle block = GlobalAlloc(GMEM_FIXED, 32);
+    ASSERT_NE(block, nullptr);
+    std::memset(block, 0x5C, 32);
+    EXPECT_EQ(GlobalReAlloc(block, 0, GMEM_MOVEABLE), nullptr);
+    EXPECT_EQ(GlobalSize(block), 32u);
+    // Without GMEM_MOVEABLE it may shrink where it stands but not grow.
+    EXPECT_EQ(GlobalReAlloc(block, 16, 0), block);
+    EXPECT_EQ(GlobalSize(block), 16u);
+    EXPECT_EQ(GlobalReAlloc(block, 64, 0), nullptr);
+    EXPECT_EQ(GlobalSize(block), 16u);
+    MEM_Handle moved = GlobalReAlloc(block, 4096, GMEM_MOVEABLE | GMEM_ZEROINIT);
+    ASSERT_NE(moved, nullptr);
+    EXPECT_FALSE(IsMoveable(moved));
+    EXPECT_EQ(GlobalSize(moved), 4096u);
+    auto *bytes = static_cast<unsigned char *>(moved);
+    EXPECT_EQ(bytes[15], 0x5C);
+    EXPECT_EQ(bytes[16], 0);
+    EXPECT_EQ(bytes[4095], 0);
+    EXPECT_EQ(GlobalUnlock(moved), 0);  // fixed blocks carry no lock count
+    EXPECT_EQ(GlobalFree(moved), nullptr);
+}
+
+TEST_F(Heap, LockedMoveableBlockGrowsOnlyWhenItMayMove) {
+    MEM_Handle h = GlobalAlloc(GMEM_MOVEABLE | GMEM_DISCARDABLE, 32);
+    ASSERT_NE(h, nullptr);
+    ASSERT_NE(GlobalLock(h), nullptr);
+    EXPECT_EQ(GlobalReAlloc(h, 64, 0), nullptr);
+    EXPECT_EQ(GlobalReAlloc(h, 16, 0), h);
+    EXPECT_EQ(GlobalSize(h), 16u);
+    EXPECT_EQ(GlobalReAlloc(h, 64, GMEM_MOVEABLE), h);  // the handle stays
+    EXPECT_EQ(GlobalSize(h), 64u);
+    EXPECT_EQ(GlobalUnlock(h), 0);
+    EXPECT_EQ(GlobalUnlock(h), 0);  // not locked: nothing to undo
+    EXPECT_EQ(GlobalFree(h), nullptr);
+}
+
+TEST_F(Heap, EmptyMoveableBlockStartsDiscarded) {
+    MEM_Handle h = GlobalAlloc(GHND, 0);
+    ASSERT_NE(h, nullptr);
+    EXPECT_TRUE(IsMoveable(h));
+    EXPECT_EQ(GlobalSize(h), 0u);
+    EXPECT_EQ(GlobalLock(h), nullptr);
+    EXPECT_EQ(GlobalFree(h), nullptr);
+    EXPECT_EQ(GlobalFree(nullptr), nullptr);
+}
+
 TEST_F(Heap, InjectedFailureFailsTheNthAllocationOnly) {
     tessarine::testing::FailAllocationAt(2);
     MEM_Handle a = GlobalAlloc(GPTR, 10);

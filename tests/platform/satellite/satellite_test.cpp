@@ -25,8 +25,9 @@ struct LoadedCopy {
     std::string dir;
     void *handle = nullptr;
 
-    LoadedCopy(const std::string &libraryName, bool withSatellite) {
-        std::string pattern = (fs::temp_directory_path() / "tessarine-satellite-XXXXXX").string();
+    LoadedCopy(const std::string &libraryName, bool withSatellite,
+               const char *folder = "tessarine-satellite-XXXXXX") {
+        std::string pattern = (fs::temp_directory_path() / folder).string();
         dir = mkdtemp(pattern.data());
         fs::copy_file(TESSARINE_LIBRARY, dir + "/" + libraryName);
         if (withSatellite) fs::copy_file(TESSARINE_SATELLITE, dir + "/libtessarineLOC.so");
@@ -63,6 +64,19 @@ TEST(Satellite, VersionedLibraryNameFindsTheSameSatellite) {
     LoadedCopy copy("libtessarine.so.1", true);
     ASSERT_NE(copy.handle, nullptr) << dlerror();
     EXPECT_EQ(copy.Show(-5), std::vector<std::string>{"Speicher reicht nicht."});
+}
+
+TEST(Satellite, OnlyTheFileNameHasItsExtensionReplaced) {
+    LoadedCopy copy("libtessarine.so", true, "tessarine.satellite-XXXXXX");
+    ASSERT_NE(copy.handle, nullptr) << dlerror();
+    EXPECT_EQ(copy.Show(-5), std::vector<std::string>{"Speicher reicht nicht."});
+}
+
+TEST(Satellite, FileNameWithoutADotLoadsWithBuiltInTexts) {
+    // Nothing to replace: no satellite is looked for, even with one beside it.
+    LoadedCopy copy("libtessarine", true, "tessarine.satellite-XXXXXX");
+    ASSERT_NE(copy.handle, nullptr) << dlerror();
+    EXPECT_EQ(copy.Show(-5), std::vector<std::string>{"Not enough memory."});
 }
 
 TEST(Satellite, LoadingWithoutASatelliteSucceedsWithBuiltInTexts) {
