@@ -270,7 +270,10 @@ int32_t WriteRowInSession(HVT_FileInfo *s, int64_t y, int64_t x, int64_t n, int6
                 wb = MakeBox(w.left, y, w.right, bottom);
                 pending = MakeBox(w.left, y, w.right, y);
                 s->writeRowBytes = static_cast<int32_t>(rowBytes);
-                if (PartialEdges(d, x, n, s->subbmps[s->subIndex].width)) {
+                // The window's edge bytes, and a byte the widening took in,
+                // go back whole: they are read first.
+                const bool widened = w.left != x || w.right != x + n;
+                if (d < 8 && (widened || PartialEdges(d, x, n, s->subbmps[s->subIndex].width))) {
                     status = HVT_ReadBlock(s->subIndex, s, &wb, s->writeRowBytes, buffer);
                     if (Failed(status)) {
                         wb.top = wb.bottom = pending.top = pending.bottom = -1;
