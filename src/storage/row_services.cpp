@@ -20,6 +20,15 @@ using tessarine::kOk;
 
 namespace {
 
+// A row outside a session's region, or a write with a gap: -1 in the low 16
+// bits only, as the band and window modes report it.
+constexpr int32_t kRowRefused = 0xFFFF;
+
+int32_t Refused(const HVT_FileInfo *s) {
+    const uint8_t mode = s->sessionMode;
+    return mode >= 1 && mode <= 3 ? kRowRefused : kErrGeneral;
+}
+
 bool InMemory(const BI_Bitmap *b) { return (b->storage & BI_STORAGE_MEMORY) != 0; }
 int32_t OwnDescriptor(const BI_Bitmap *b) { return b->tileFile == -1 ? 1 : 0; }
 
@@ -134,7 +143,7 @@ int32_t ReadRowInSession(BI_Bitmap *b, HVT_FileInfo *s, int64_t y, int64_t x, in
     if (s->readBuffer == nullptr || s->header == nullptr) return kErrGeneral;
     const HVT_Box &region = s->regionBox;
     if (!RunInside(y, x, n, region.left, region.top, region.right, region.bottom))
-        return kErrGeneral;
+        return Refused(s);
     if (n == 0) return kOk;
     (void)b;
     const int64_t d = s->header->bitsPerPixel;
@@ -245,7 +254,7 @@ int32_t WriteRowInSession(HVT_FileInfo *s, int64_t y, int64_t x, int64_t n, int6
     if (s->writeBuffer == nullptr || s->header == nullptr) return kErrGeneral;
     const HVT_Box &region = s->regionBox;
     if (!RunInside(y, x, n, region.left, region.top, region.right, region.bottom))
-        return kErrGeneral;
+        return Refused(s);
     if (n == 0) return kOk;
     const int64_t d = s->header->bitsPerPixel;
     const int64_t size = BlockSize(s->writeHandle);
@@ -284,7 +293,7 @@ int32_t WriteRowInSession(HVT_FileInfo *s, int64_t y, int64_t x, int64_t n, int6
             if (y >= pending.bottom)
                 pending.bottom += 1;
             else if (y < pending.top)
-                return kErrGeneral;
+                return kRowRefused;
             offset = (y - wb.top) * s->writeRowBytes;
             break;
         }
@@ -300,8 +309,8 @@ int32_t WriteRowInSession(HVT_FileInfo *s, int64_t y, int64_t x, int64_t n, int6
                 pending = MakeBox(wb.left, y, wb.right, y);
             }
             const bool isPending = y >= pending.top && y < pending.bottom;
-            if (!isPending && y != pending.top - 1 && y != pending.bottom) return kErrGeneral;
-            if (x < wb.left || x + n > wb.right) return kErrGeneral;
+            if (!isPending && y != pending.top - 1 && y != pending.bottom) return kRowRefused;
+            if (x < wb.left || x + n > wb.right) return kRowRefused;
             const int64_t rowStart = (y - wb.top) * s->bandRowBytes;
             offset = rowStart - ((d * wb.left) >> 3) + ((d * x) >> 3);
             if (rowStart < 0 || rowStart + s->bandRowBytes > size) return kErrGeneral;
