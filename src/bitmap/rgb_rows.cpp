@@ -8,6 +8,7 @@
 
 #include "bitmap/color_tables.h"
 #include "bitmap/rgb_rows.h"
+#include "bitmap/rgb_split.h"
 #include "bitmap/row_pack.h"
 #include "bitmap/row_steps.h"
 #include "core/status.h"
@@ -66,12 +67,7 @@ void EmitTrueColour(const RgbOut &o, const uint8_t *s, int64_t n) {
         std::memcpy(o.p0, s, static_cast<size_t>(n * 3));
         return;
     }
-    uint8_t *r = o.p0, *g = o.p1, *b = o.p2;
-    for (int64_t i = 0; i < n; ++i, s += 3) {
-        r[i] = s[0];
-        g[i] = s[1];
-        b[i] = s[2];
-    }
+    bm::SplitRgb(s, n, o.p0, o.p1, o.p2);
 }
 
 void FillGrayLut(Lut &lut, int n, uint8_t (*level)(int)) {
@@ -233,13 +229,7 @@ int32_t BI_PackRGBRow(uint8_t imageType, uint8_t d, const uint8_t *r, const uint
             }
             return kOk;
         }
-        case 4:
-            for (int64_t i = 0; i < n; ++i, row += 3) {
-                row[0] = r[i];
-                row[1] = g[i];
-                row[2] = b[i];
-            }
-            return kOk;
+        case 4: JoinRgb(r, g, b, n, row); return kOk;
         default: return kErrUnsupported;
     }
 }
