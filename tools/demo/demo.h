@@ -4,3 +4,4 @@
 void DemoStatuses();
 void DemoMemory();
 void DemoRawFile();
+void DemoRows();

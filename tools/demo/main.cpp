@@ -62,5 +62,6 @@ int main() {
     DemoStatuses();
     DemoMemory();
     DemoRawFile();
+    DemoRows();
     return 0;
 }
