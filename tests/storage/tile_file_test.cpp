@@ -521,6 +521,39 @@ TEST_F(TileFileTest, TileTableFailures) {
     }
 }
 
+TEST_F(TileOpenTest, TileTableThatCannotFitTheFileIsRefused) {
+    ASSERT_EQ(Create(8, 10, 10), TS_OK);
+    const int32_t huge[2] = {INT32_MAX, INT32_MAX};
+    Poke(80 + 8, huge, 8);
+    HVT_FileInfo info;
+    HVT_InitFileInfo(&info);
+    BI_Bitmap view = View(fd_);
+    ASSERT_EQ(HVT_TileFileBegin(&view, &info, 0), TS_OK);
+    tessarine::testing::ResetInjection();
+    EXPECT_EQ(HVT_GetSubbmpTileHdrs(0, &info), -50);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 0) << "refused before allocating";
+    EXPECT_EQ(info.subbmps[0].tileHdrs, nullptr);
+    const HVT_Box box{0, 0, 10, 10};
+    uint8_t buf[200];
+    EXPECT_EQ(HVT_ReadBlock(0, &info, &box, 20, buf), -50);
+    HVT_TileFileEnd(&info, 0);
+}
+
+TEST_F(TileOpenTest, HostileTileRecordsAreRefusedWhenUsed) {
+    ASSERT_EQ(Create(8, 10, 10), TS_OK);
+    const int32_t wide[5] = {116, -100000, 0, 2000000000, 10};
+    Poke(96, wide, 20);
+    HVT_FileInfo info;
+    HVT_InitFileInfo(&info);
+    BI_Bitmap view = View(fd_);
+    ASSERT_EQ(HVT_TileFileBegin(&view, &info, 0), TS_OK);
+    const HVT_Box box{0, 0, 10, 10};
+    uint8_t buf[200];
+    EXPECT_EQ(HVT_ReadBlock(0, &info, &box, 20, buf), -50);
+    EXPECT_EQ(HVT_SaveBlockWithBitShift(0, &info, &box, 20, buf), -50);
+    HVT_TileFileEnd(&info, 0);
+}
+
 TEST_F(TileFileTest, TileRowsAreWrittenAndReadWhole) {
     tiletest::TileFile f(1, 8197, 20);
     ASSERT_EQ(f.Status(), TS_OK);

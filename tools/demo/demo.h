@@ -4,4 +4,5 @@
 void DemoStatuses();
 void DemoMemory();
 void DemoRawFile();
+void DemoTiles();
 void DemoRows();

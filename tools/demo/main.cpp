@@ -62,6 +62,7 @@ int main() {
     DemoStatuses();
     DemoMemory();
     DemoRawFile();
+    DemoTiles();
     DemoRows();
     return 0;
 }
