@@ -13,6 +13,8 @@ namespace tessarine::bitmap {
 // `read(x, count, out)` reads one run; count + 2 bytes land in out.
 template <class Read>
 int32_t PaddedRead(const BI_Bitmap *b, int32_t x, int32_t count, uint8_t *out, Read &&read) {
+    // The margins must stay within what a run can name.
+    if (count < 0 || count > INT32_MAX - 2 || x == INT32_MIN) return kErrGeneral;
     const bool atLeft = x == 0;
     const bool atRight = int64_t{x} + count == b->width;
     int32_t status;

@@ -30,7 +30,7 @@ template <class Convert>
 int32_t SetRowSteps(BI_Bitmap *b, int32_t y, int32_t x, int32_t count, int64_t needed,
                     Convert &&convert) {
     const int64_t right = int64_t{x} + count;
-    if (right > INT32_MAX || right < INT32_MIN) return kErrGeneral;
+    if (right > INT32_MAX || right < INT32_MIN || y == INT32_MAX) return kErrGeneral;
     const HVT_Box box{x, y, static_cast<int32_t>(right), y + 1};
     storage::RowAccess access;
     int32_t status = storage::LockRowWrite(b, box, needed, &access);

@@ -138,14 +138,13 @@ bool Overlap(const HVT_Box &a, const HVT_Box &b) {
            std::max(a.top, b.top) < std::min(a.bottom, b.bottom);
 }
 
-int32_t ReadRowInSession(BI_Bitmap *b, HVT_FileInfo *s, int64_t y, int64_t x, int64_t n,
+int32_t ReadRowInSession(HVT_FileInfo *s, int64_t y, int64_t x, int64_t n,
                          int64_t needed, ts::RowAccess *a) {
     if (s->readBuffer == nullptr || s->header == nullptr) return kErrGeneral;
     const HVT_Box &region = s->regionBox;
     if (!RunInside(y, x, n, region.left, region.top, region.right, region.bottom))
         return Refused(s);
     if (n == 0) return kOk;
-    (void)b;
     const int64_t d = s->header->bitsPerPixel;
     const Span w = Widen(d, x, n, region.right);
     const int64_t size = BlockSize(s->readHandle);
@@ -372,7 +371,7 @@ int32_t LockRowRead(BI_Bitmap *b, int32_t y, int32_t x, int32_t count, int64_t n
     if (b->bitsPerPixel == 0) return kErrUnsupported;
     if (InMemory(b)) return LockMemoryRow(b, y, x, n, needed, a);
     if (b->ioSession == nullptr) return ReadRowAlone(b, y, x, n, needed, a);
-    return ReadRowInSession(b, b->ioSession, y, x, n, needed, a);
+    return ReadRowInSession(b->ioSession, y, x, n, needed, a);
 }
 
 void EndRowRead(BI_Bitmap *b, RowAccess *a) {

@@ -68,14 +68,14 @@ TEST_F(ColorTable, ImpliedTablesOfGrayAndBlackAndWhite) {
     EXPECT_EQ(t[3 * 100 + 2], 155);
     BI_Bitmap *g4 = Make(2, 4);
     ASSERT_EQ(BI_GetRGBColorTable(g4, &count, t), TS_OK);
-    for (int i = 0; i < 16; ++i) EXPECT_EQ(t[3 * i], (15 - i) * 17);
+    for (int i = 0; i < 16; ++i) { EXPECT_EQ(t[3 * i], (15 - i) * 17); }
     BI_Bitmap *bw = Make(1, 1);
     ASSERT_EQ(BI_GetRGBColorTable(bw, &count, t), TS_OK);
     EXPECT_EQ(std::vector<uint8_t>(t, t + 6), (std::vector<uint8_t>{255, 255, 255, 0, 0, 0}));
     ASSERT_EQ(BI_GetCMYKColorTable(bw, &count, t), TS_OK);
     EXPECT_EQ(std::vector<uint8_t>(t, t + 8), (std::vector<uint8_t>{0, 0, 0, 0, 0, 0, 0, 255}));
     ASSERT_EQ(BI_GetCMYKColorTable(g4, &count, t), TS_OK);
-    for (int i = 0; i < 16; ++i) EXPECT_EQ(t[4 * i + 3], i * 17);
+    for (int i = 0; i < 16; ++i) { EXPECT_EQ(t[4 * i + 3], i * 17); }
     ASSERT_EQ(BI_GetCMYKColorTable(g8, &count, t), TS_OK);
     EXPECT_EQ(t[4 * 77 + 3], 77);
     EXPECT_EQ(t[4 * 77], 0);
@@ -215,7 +215,7 @@ TEST_F(ColorTable, MapTablesBetweenLevels) {
     EXPECT_EQ(map[127], 0);
     EXPECT_EQ(map[128], 1);
     ASSERT_EQ(BI_GetMapTable(g8, g8, map), TS_OK);
-    for (int i = 0; i < 256; ++i) ASSERT_EQ(map[i], i);
+    for (int i = 0; i < 256; ++i) { ASSERT_EQ(map[i], i); }
 }
 
 TEST_F(ColorTable, MapTablesToAndFromIndexes) {

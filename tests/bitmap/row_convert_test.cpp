@@ -354,7 +354,7 @@ TEST_F(RowConvert, RunsOutsideTheBitmapAreRefused) {
         EXPECT_EQ(BI_SetGRow(0, 7, 2, v, g), -1);
         EXPECT_EQ(BI_SetGRow(0, 0, 9, v, g), -1);
         // more bytes than the pixels hold: 3-byte triples into an 8-bit row
-        if (storage == 1) EXPECT_EQ(BI_SetRGBRowInterlace(2, 0, 8, v, g), -1);
+        if (storage == 1) { EXPECT_EQ(BI_SetRGBRowInterlace(2, 0, 8, v, g), -1); }
     }
 }
 

@@ -84,7 +84,9 @@ TEST_F(RowFailure, AllocationFailures) {
                         EXPECT_TRUE(rowtest::ReadImage(b) == before);
                     } else {
                         EXPECT_EQ(s, -5);
-                        if (!c.writes) EXPECT_EQ(buf, Bytes(160, 0x5A));  // outputs keep what they held
+                        if (!c.writes) {
+                            EXPECT_EQ(buf, Bytes(160, 0x5A));  // outputs keep what they held
+                        }
                     }
                 } else {
                     EXPECT_EQ(s, TS_OK);
@@ -92,7 +94,7 @@ TEST_F(RowFailure, AllocationFailures) {
                 EXPECT_EQ(tstest::OpenDescriptorCount(), fds);
             });
             EXPECT_GE(made, 2);  // the file's state and the temporary row at least
-            if (!c.writes) EXPECT_TRUE(rowtest::ReadImage(b) == before);
+            if (!c.writes) { EXPECT_TRUE(rowtest::ReadImage(b) == before); }
             BI_DeleteBitmap(&b);
         }
     }
@@ -118,7 +120,7 @@ TEST_F(RowFailure, ReadAndSeekFailures) {
                             EXPECT_TRUE(rowtest::ReadImage(b) == before);
                         } else {
                             EXPECT_EQ(s, -50);
-                            if (!c.writes) EXPECT_EQ(buf, Bytes(160, 0x5A));
+                            if (!c.writes) { EXPECT_EQ(buf, Bytes(160, 0x5A)); }
                         }
                     } else {
                         EXPECT_EQ(s, TS_OK);
@@ -127,7 +129,7 @@ TEST_F(RowFailure, ReadAndSeekFailures) {
                     EXPECT_EQ(tessarine::testing::LiveBlocks(), live);
                 });
                 EXPECT_GE(calls, 1);
-                if (!c.writes) EXPECT_TRUE(rowtest::ReadImage(b) == before);
+                if (!c.writes) { EXPECT_TRUE(rowtest::ReadImage(b) == before); }
                 BI_DeleteBitmap(&b);
             }
         }
@@ -150,8 +152,9 @@ TEST_F(RowFailure, WriteFailuresAreNotReportedBySetters) {
                 EXPECT_EQ(c.run(b, buf.data()), TS_OK);
                 EXPECT_EQ(tstest::OpenDescriptorCount(), fds);
                 EXPECT_EQ(tessarine::testing::LiveBlocks(), live);
-                if (tessarine::testing::FileFailureHit(FileCall::Write))
+                if (tessarine::testing::FileFailureHit(FileCall::Write)) {
                     EXPECT_TRUE(rowtest::ReadImage(b) == before);
+                }
             });
             EXPECT_EQ(calls, 1);
             BI_DeleteBitmap(&b);

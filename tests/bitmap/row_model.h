@@ -34,10 +34,11 @@ inline const std::vector<Layout> &Layouts() {
     return all;
 }
 
-enum class Route { Memory, Alone, AloneOwnFd, Mode0, Mode1, Mode2 };
+enum class Route { Memory, Alone, AloneOwnFd, Mode0, Mode1, Mode2, Mode3 };
 inline const std::vector<Route> &Routes() {
     static const std::vector<Route> all = {Route::Memory, Route::Alone, Route::AloneOwnFd,
-                                           Route::Mode0,  Route::Mode1, Route::Mode2};
+                                           Route::Mode0,  Route::Mode1, Route::Mode2,
+                                           Route::Mode3};
     return all;
 }
 inline const char *RouteName(Route r) {
@@ -48,6 +49,7 @@ inline const char *RouteName(Route r) {
         case Route::Mode0: return "session mode 0";
         case Route::Mode1: return "session mode 1";
         case Route::Mode2: return "session mode 2";
+        case Route::Mode3: return "session mode 3";
     }
     return "?";
 }
@@ -184,7 +186,7 @@ inline BI_Bitmap *MakeBitmap(const Layout &l, Route route, const Image &img,
         b->tileFile = -1;
     }
     WriteImage(b, img);
-    if (l.type == 3) EXPECT_EQ(MakeColorTableIndex(b), TS_OK);
+    if (l.type == 3) { EXPECT_EQ(MakeColorTableIndex(b), TS_OK); }
     return b;
 }
 
@@ -193,6 +195,7 @@ inline int32_t BeginRoute(Route r, BI_Bitmap *b, uint8_t flags) {
         case Route::Mode0: return HVT_TileFileRowIOBegin(flags, b, nullptr, 0, 0, 0);
         case Route::Mode1: return HVT_TileFileRowIOBegin(flags, b, nullptr, 1, 0, 0);
         case Route::Mode2: return HVT_TileFileRowIOBegin(flags, b, nullptr, 2, 0, 0);
+        case Route::Mode3: return HVT_TileFileRowIOBegin(flags, b, nullptr, 3, 0, 64 * 8);  // small bands
         default: return TS_OK;
     }
 }

@@ -335,7 +335,8 @@ void Merge(Route route, const Layout &l, std::vector<uint8_t> &model, const std:
     int64_t lo = 0, hi = rowBytes;
     switch (route) {
         case Route::Memory:
-        case Route::Mode2: break;
+        case Route::Mode2:
+        case Route::Mode3: break;
         case Route::Alone:
         case Route::AloneOwnFd:
             lo = (x * d) >> 3;
@@ -449,9 +450,10 @@ TEST_F(RowRoutes, EverySetterOnEveryRouteMatchesTheModel) {
             for (size_t r = 1; r < results.size(); ++r)
                 for (int y = 0; y < height; ++y)
                     for (int32_t p = runs[y].first; p < runs[y].first + runs[y].second; ++p)
-                        if (l.d <= 8)
+                        if (l.d <= 8) {
                             ASSERT_EQ(results[r].Pixel(y, p), results[0].Pixel(y, p))
                                 << l.name << " " << Name(f) << " route " << r << " row " << y;
+                        }
         }
     }
 }

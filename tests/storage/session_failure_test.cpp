@@ -22,7 +22,7 @@ class SessionFailure : public tstest::Sandbox {
         BI_Bitmap *b = nullptr;
         EXPECT_EQ(BI_CreateBlankBmp(2, 8, 40, 30, 300, 300, 1, 0, nullptr, &b, 2, 0, 0, 0), TS_OK);
         const Bytes row(40, 3);
-        for (int y = 0; y < 30; ++y) EXPECT_EQ(BI_SetGRow(y, 0, 40, row.data(), b), TS_OK);
+        for (int y = 0; y < 30; ++y) { EXPECT_EQ(BI_SetGRow(y, 0, 40, row.data(), b), TS_OK); }
         if (ownDescriptor) {
             FM_Close(b->tileFile);
             b->tileFile = -1;
@@ -149,7 +149,7 @@ TEST_F(SessionFailure, EndDropsAFailedSave) {
             tessarine::testing::ResetInjection();
             EXPECT_EQ(b->ioSession, nullptr);
             EXPECT_EQ(tstest::OpenDescriptorCount(), fds);
-            if (kind != FileCall::Read) EXPECT_TRUE(hit);
+            if (kind != FileCall::Read) { EXPECT_TRUE(hit); }
             EXPECT_EQ(At(b, 4, 6), hit ? 3 : 9);
             BI_DeleteBitmap(&b);
         }

@@ -202,7 +202,7 @@ TEST_F(Session, WritesGoInOrderWithNoGap) {
     BI_Bitmap *t = Make(8, 16, 40);
     ASSERT_EQ(HVT_TileFileRowIOBegin(2, t, nullptr, 2, 0, 0), TS_OK);
     const Bytes row(16, 7);
-    for (int y : {5, 6, 7}) ASSERT_EQ(BI_SetGRow(y, 0, 16, row.data(), t), TS_OK);
+    for (int y : {5, 6, 7}) { ASSERT_EQ(BI_SetGRow(y, 0, 16, row.data(), t), TS_OK); }
     EXPECT_EQ(BI_SetGRow(20, 0, 16, row.data(), t), 0xFFFF);
     EXPECT_EQ(TS_STATUS(BI_SetGRow(3, 0, 16, row.data(), t)), -1);
     EXPECT_EQ(BI_SetGRow(6, 0, 16, row.data(), t), TS_OK);  // a pending row again
@@ -356,7 +356,7 @@ TEST_F(Session, ReachesSubBitmapsAndTilesAcross) {
     ASSERT_EQ(HVT_TileFileRowIOBegin(1, t, nullptr, 2, 0, 0), TS_OK);
     for (int y : {0, 1023, 1024, 1029}) {
         ASSERT_EQ(BI_GetGRow(t, y, 8180, 20, row.data()), TS_OK);
-        for (int x = 0; x < 20; ++x) ASSERT_EQ(row[x], static_cast<uint8_t>((8180 + x) * 7 + y));
+        for (int x = 0; x < 20; ++x) { ASSERT_EQ(row[x], static_cast<uint8_t>((8180 + x) * 7 + y)); }
     }
     HVT_TileFileRowColIOEnd(t);
     // a second sub-bitmap through its own session
@@ -375,7 +375,7 @@ TEST_F(Session, ReachesSubBitmapsAndTilesAcross) {
     EXPECT_EQ(t->ioSession->regionBox.right, 30);
     EXPECT_EQ(t->ioSession->bandRows, 20);
     const Bytes small(30, 99);
-    for (int y = 0; y < 20; ++y) ASSERT_EQ(BI_SetGRow(y, 0, 30, small.data(), t), TS_OK);
+    for (int y = 0; y < 20; ++y) { ASSERT_EQ(BI_SetGRow(y, 0, 30, small.data(), t), TS_OK); }
     HVT_TileFileRowColIOEnd(t);
     ASSERT_EQ(HVT_TileFileRowIOBegin(1, t, nullptr, 2, 1, 0), TS_OK);
     ASSERT_EQ(BI_GetGRow(t, 19, 0, 30, row.data()), TS_OK);
@@ -394,7 +394,7 @@ TEST_F(Session, BlockReadGivesAColumn) {
         uint8_t *p = nullptr;
         void *temp = nullptr;
         ASSERT_EQ(tessarine::storage::BI_LockBlockRead(t, &column, &stride, &p, &temp), TS_OK);
-        for (int i = 0; i < 7; ++i) EXPECT_EQ(p[i * stride], (i + 2) * 3);
+        for (int i = 0; i < 7; ++i) { EXPECT_EQ(p[i * stride], (i + 2) * 3); }
         if (storage == 1) {
             EXPECT_EQ(stride, 16);
             EXPECT_EQ(temp, nullptr);
