@@ -3,6 +3,7 @@
 #include <tessarine/core.h>
 
 #include "bitmap/color_tables.h"
+#include "bitmap/rgb_split.h"
 #include "bitmap/row_pack.h"
 #include "bitmap/row_steps.h"
 #include "core/status.h"
@@ -18,12 +19,7 @@ int32_t UnpackCmyk(uint8_t type, uint8_t d, MEM_Handle table, const uint8_t *src
     if (count < 1) return kOk;
     uint8_t *c = out[0], *m = out[1], *y = out[2], *k = out[3];
     if (type == 4) {
-        for (int64_t i = 0; i < count; ++i, src += 4) {
-            c[i] = src[0];
-            m[i] = src[1];
-            y[i] = src[2];
-            k[i] = src[3];
-        }
+        bm::SplitCmyk(src, count, out);
         return kOk;
     }
     if (type != 3) return kErrUnsupported;
@@ -74,13 +70,9 @@ TESSARINE_API int32_t BI_SetCMYKRow(int32_t y, int32_t x, int32_t count, const u
                                     const uint8_t *m, const uint8_t *yellow, const uint8_t *k,
                                     BI_Bitmap *bitmap) {
     const int64_t n = bm::Pixels(count);
+    const uint8_t *const planes[4] = {c, m, yellow, k};
     return bm::SetRowSteps(bitmap, y, x, count, n * 4, [&](uint8_t *row, int64_t) {
-        for (int64_t i = 0; i < n; ++i, row += 4) {
-            row[0] = c[i];
-            row[1] = m[i];
-            row[2] = yellow[i];
-            row[3] = k[i];
-        }
+        bm::JoinCmyk(planes, n, row);
         return kOk;
     });
 }

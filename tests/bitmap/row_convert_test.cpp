@@ -359,3 +359,26 @@ TEST_F(RowConvert, RunsOutsideTheBitmapAreRefused) {
 }
 
 }  // namespace
+
+namespace {
+
+TEST_F(RowConvert, LongTrueColourRowsThroughPlanesAndBack) {
+    for (int64_t n : {1, 15, 16, 17, 47, 1000, 4099}) {
+        Bytes rgb(n * 3), cmyk(n * 4);
+        for (int64_t i = 0; i < n * 3; ++i) rgb[i] = static_cast<uint8_t>(i * 7 + 3);
+        for (int64_t i = 0; i < n * 4; ++i) cmyk[i] = static_cast<uint8_t>(i * 5 + 1);
+        Bytes p[4] = {Bytes(n), Bytes(n), Bytes(n), Bytes(n)};
+        ASSERT_EQ(BI_UnpackRGBRow(4, 24, nullptr, rgb.data(), 0, static_cast<int32_t>(n), p[0].data(),
+                                  p[1].data(), p[2].data()),
+                  TS_OK);
+        for (int64_t i = 0; i < n; ++i)
+            for (int k = 0; k < 3; ++k) ASSERT_EQ(p[k][i], rgb[3 * i + k]) << n << " " << i;
+        ASSERT_EQ(BI_UnpackCMYKRow(4, 32, nullptr, cmyk.data(), 0, static_cast<int32_t>(n), p[0].data(),
+                                   p[1].data(), p[2].data(), p[3].data()),
+                  TS_OK);
+        for (int64_t i = 0; i < n; ++i)
+            for (int k = 0; k < 4; ++k) ASSERT_EQ(p[k][i], cmyk[4 * i + k]) << n << " " << i;
+    }
+}
+
+}  // namespace
