@@ -51,7 +51,10 @@ TESSARINE_API int32_t BI_PackBWRow(const uint8_t *flags, int32_t x, int32_t coun
     for (int i = r.s; i < 8; ++i)
         if (*flags++) b |= static_cast<uint8_t>(0x80 >> i);
     row[0] = b;
-    for (int64_t j = 1; j < r.n; ++j, flags += 8) row[j] = bm::NonZeroBit::Pack8(flags);
+    if (r.n > 1) {
+        bm::PackFlagBytes(flags, r.n - 1, row + 1, false);
+        flags += (r.n - 1) * 8;
+    }
     b = static_cast<uint8_t>(row[r.n] & (0xFF >> (r.e + 1)));
     for (int i = 0; i <= r.e; ++i)
         if (*flags++) b |= static_cast<uint8_t>(0x80 >> i);

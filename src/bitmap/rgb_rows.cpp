@@ -129,6 +129,7 @@ int32_t GetRgb(BI_Bitmap *b, int32_t y, int32_t x, int32_t count, const RgbOut &
 }
 
 struct EqualsOne {
+    static constexpr int kWide = -1;
     static bool Bit(uint8_t v) { return v == 1; }
     static uint8_t Pack8(const uint8_t *v) {
         uint8_t out = 0;

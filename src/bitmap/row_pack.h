@@ -50,8 +50,14 @@ inline uint8_t GatherLowBits(uint64_t ones) {
     return static_cast<uint8_t>((ones * 0x8040201008040201ULL) >> 56);
 }
 
-// What makes a one-byte value a set bit when it is packed into 1 bit.
+// Packs 8 * bytes values into whole bytes of 1-bit pixels: a value is a set
+// bit when it is non-zero, or with `highBit` when it is above 127.
+void PackFlagBytes(const uint8_t *values, int64_t bytes, uint8_t *dst, bool highBit);
+
+// What makes a one-byte value a set bit when it is packed into 1 bit; kWide
+// says which whole-byte packing serves it (-1 none).
 struct NonZeroBit {
+    static constexpr int kWide = 0;
     static bool Bit(uint8_t v) { return v != 0; }
     static uint8_t Pack8(const uint8_t *v) {
         const uint64_t w = Load64(v);
@@ -61,6 +67,7 @@ struct NonZeroBit {
     }
 };
 struct HighBit {  // a density above 127 is black
+    static constexpr int kWide = 1;
     static bool Bit(uint8_t v) { return v > 127; }
     static uint8_t Pack8(const uint8_t *v) {
         return GatherLowBits((Load64(v) & 0x8080808080808080ULL) >> 7);
@@ -115,6 +122,13 @@ void PackBits1(const uint8_t *v, int64_t x, int64_t count, uint8_t *dst) {
             b = Rule::Bit(*v) ? (b | bit) : (b & ~bit);
         }
         *dst++ = b;
+    }
+    if constexpr (Rule::kWide >= 0) {
+        const int64_t bytes = count >> 3;
+        PackFlagBytes(v, bytes, dst, Rule::kWide == 1);
+        dst += bytes;
+        v += bytes * 8;
+        count &= 7;
     }
     for (; count >= 8; count -= 8, v += 8) *dst++ = Rule::Pack8(v);
     if (count > 0) {

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <random>
 #include <vector>
 
 #include <tessarine/tessarine.h>
@@ -378,6 +379,37 @@ TEST_F(RowConvert, LongTrueColourRowsThroughPlanesAndBack) {
                   TS_OK);
         for (int64_t i = 0; i < n; ++i)
             for (int k = 0; k < 4; ++k) ASSERT_EQ(p[k][i], cmyk[4 * i + k]) << n << " " << i;
+    }
+}
+
+}  // namespace
+
+namespace {
+
+TEST_F(RowConvert, LongBlackAndWhiteRowsPackAndUnpackExactly) {
+    std::mt19937 rng(5);
+    for (int32_t x : {0, 3, 8, 13}) {
+        for (int32_t n : {64, 129, 1000, 4097}) {
+            Bytes v(n + 16);
+            for (auto &f : v) f = rng() % 3 == 0 ? 0 : static_cast<uint8_t>(rng());
+            const int64_t bytes = ((x + n + 7) >> 3) + 1;
+            Bytes bw(bytes, 0x5A), idx(bytes, 0x5A), gray(bytes, 0x5A);
+            ASSERT_EQ(BI_PackBWRow(v.data(), x, n, bw.data() + (x >> 3)), TS_OK);
+            ASSERT_EQ(BI_PackIndexRow(1, v.data(), x, n, idx.data() + (x >> 3)), TS_OK);
+            ASSERT_EQ(BI_PackGRow(1, v.data(), static_cast<int8_t>(x), n, gray.data() + (x >> 3)), TS_OK);
+            for (int64_t p = 0; p < bytes * 8; ++p) {
+                const bool in = p >= x && p < x + n;
+                const int old = (0x5A >> (7 - (p & 7))) & 1;
+                const int bit = (bw[p >> 3] >> (7 - (p & 7))) & 1;
+                ASSERT_EQ(bit, in ? v[p - x] != 0 : old) << x << " " << n << " " << p;
+                ASSERT_EQ((idx[p >> 3] >> (7 - (p & 7))) & 1, in ? v[p - x] != 0 : old);
+                ASSERT_EQ((gray[p >> 3] >> (7 - (p & 7))) & 1, in ? v[p - x] > 127 : old);
+            }
+            Bytes back(n + 16, 9);
+            ASSERT_EQ(BI_UnpackBWRow(bw.data() + (x >> 3), x, n, back.data()), TS_OK);
+            for (int32_t i = 0; i < n; ++i) ASSERT_EQ(back[i], v[i] != 0);
+            EXPECT_EQ(back[n], 9);
+        }
     }
 }
 
