@@ -38,7 +38,10 @@ TESSARINE_API int32_t BI_UnpackBWRow(const uint8_t *row, int32_t x, int32_t coun
     const BitRun r = RunOf(x, count);
     const uint8_t first = row[0];
     for (int i = r.s; i < 8; ++i) *out++ = (first >> (7 - i)) & 1;
-    for (int64_t j = 1; j < r.n; ++j, out += 8) bm::Store64(out, bm::kBitFlags[row[j]]);
+    if (r.n > 1) {
+        bm::UnpackFlagBytes(row + 1, r.n - 1, out);
+        out += (r.n - 1) * 8;
+    }
     const uint8_t last = row[r.n];
     for (int i = 0; i <= r.e; ++i) *out++ = (last >> (7 - i)) & 1;
     return kOk;

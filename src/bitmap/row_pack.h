@@ -53,6 +53,8 @@ inline uint8_t GatherLowBits(uint64_t ones) {
 // Packs 8 * bytes values into whole bytes of 1-bit pixels: a value is a set
 // bit when it is non-zero, or with `highBit` when it is above 127.
 void PackFlagBytes(const uint8_t *values, int64_t bytes, uint8_t *dst, bool highBit);
+// The other way: `bytes` whole bytes to 8 * bytes values of 0 and 1.
+void UnpackFlagBytes(const uint8_t *src, int64_t bytes, uint8_t *out);
 
 // What makes a one-byte value a set bit when it is packed into 1 bit; kWide
 // says which whole-byte packing serves it (-1 none).
@@ -82,7 +84,11 @@ inline void UnpackBits1(const uint8_t *src, int64_t x, int64_t count, uint8_t *o
         const uint8_t b = *src++;
         for (; phase < 8 && count > 0; ++phase, --count) *out++ = (b >> (7 - phase)) & 1;
     }
-    for (; count >= 8; count -= 8, out += 8) Store64(out, kBitFlags[*src++]);
+    const int64_t bytes = count >> 3;
+    UnpackFlagBytes(src, bytes, out);
+    src += bytes;
+    out += bytes * 8;
+    count &= 7;
     if (count > 0) {
         const uint8_t b = *src;
         for (int i = 0; i < count; ++i) out[i] = (b >> (7 - i)) & 1;
