@@ -56,6 +56,86 @@ TESSARINE_API int32_t BI_CreateBlankBmp(uint8_t imageType, uint8_t bitsPerPixel,
 TESSARINE_API int32_t BI_GetBlankBmp(const BI_Bitmap *source, const RECT *rect, BI_Bitmap **out,
                                      uint8_t storage);
 
+/* ---- Colour tables, map tables and row access ------------------------------ */
+
+TESSARINE_API int32_t BI_SetRGBColorTable(BI_Bitmap *bitmap, int32_t count, const uint8_t *entries);
+TESSARINE_API int32_t BI_GetRGBColorTable(const BI_Bitmap *bitmap, int32_t *count, uint8_t *entries);
+TESSARINE_API int32_t BI_GetCMYKColorTable(const BI_Bitmap *bitmap, int32_t *count,
+                                           uint8_t *entries);
+TESSARINE_API uint8_t BI_RGBMapToColorIndex(uint8_t r, uint8_t g, uint8_t b, int32_t count,
+                                            const uint8_t *entries);
+TESSARINE_API int32_t BI_GetMapTable(const BI_Bitmap *source, const BI_Bitmap *destination,
+                                     uint8_t *map);
+TESSARINE_API int32_t MakeColorTableIndex(BI_Bitmap *bitmap);
+/* Gray density (0 white, 255 black) of an RGB colour. */
+TESSARINE_API uint8_t RGB2GrayScale(uint8_t r, uint8_t g, uint8_t b);
+
+/* Rows as colour planes or triples. A row pointer addresses the byte that
+   holds pixel x; x gives the pixel's place in that byte. */
+TESSARINE_API int32_t BI_UnpackRGBRow(uint8_t imageType, uint8_t bitsPerPixel, MEM_Handle table,
+                                      const uint8_t *row, int32_t x, int32_t count, uint8_t *r,
+                                      uint8_t *g, uint8_t *b);
+TESSARINE_API int32_t BI_UnpackRGBRowInterlace(uint8_t imageType, uint8_t bitsPerPixel,
+                                               MEM_Handle table, const uint8_t *row, int32_t x,
+                                               int32_t count, uint8_t *rgb);
+TESSARINE_API int32_t BI_UnpackBGRRowInterlace(uint8_t imageType, uint8_t bitsPerPixel,
+                                               MEM_Handle table, const uint8_t *row, int32_t x,
+                                               int32_t count, uint8_t *bgr);
+TESSARINE_API int32_t BI_GetRGBRow(BI_Bitmap *bitmap, int32_t y, int32_t x, int32_t count,
+                                   uint8_t *r, uint8_t *g, uint8_t *b);
+TESSARINE_API int32_t BI_GetRGBRowInterlace(BI_Bitmap *bitmap, int32_t y, int32_t x,
+                                            int32_t count, uint8_t *rgb);
+TESSARINE_API int32_t BI_GetBGRRowInterlace(BI_Bitmap *bitmap, int32_t y, int32_t x,
+                                            int32_t count, uint8_t *bgr);
+TESSARINE_API int32_t BI_SetRGBRow(int32_t y, int32_t x, int32_t count, const uint8_t *r,
+                                   const uint8_t *g, const uint8_t *b, BI_Bitmap *bitmap);
+TESSARINE_API int32_t BI_SetRGBRowInterlace(int32_t y, int32_t x, int32_t count,
+                                            const uint8_t *rgb, BI_Bitmap *bitmap);
+TESSARINE_API int32_t BI_SetBGRRowInterlace(int32_t y, int32_t x, int32_t count,
+                                            const uint8_t *bgr, BI_Bitmap *bitmap);
+TESSARINE_API int32_t BI_UnpackCMYKRow(uint8_t imageType, uint8_t bitsPerPixel, MEM_Handle table,
+                                       const uint8_t *row, int32_t x, int32_t count, uint8_t *c,
+                                       uint8_t *m, uint8_t *y, uint8_t *k);
+TESSARINE_API int32_t BI_GetCMYKRow(BI_Bitmap *bitmap, int32_t y, int32_t x, int32_t count,
+                                    uint8_t *c, uint8_t *m, uint8_t *yellow, uint8_t *k);
+TESSARINE_API int32_t BI_SetCMYKRow(int32_t y, int32_t x, int32_t count, const uint8_t *c,
+                                    const uint8_t *m, const uint8_t *yellow, const uint8_t *k,
+                                    BI_Bitmap *bitmap);
+
+/* Rows as one byte per pixel: indexes, densities, black-and-white flags. */
+TESSARINE_API int32_t BI_UnpackIndexRow(uint8_t bitsPerPixel, const uint8_t *row, int32_t x,
+                                        int32_t count, uint8_t *out);
+TESSARINE_API int32_t BI_PackIndexRow(uint8_t bitsPerPixel, const uint8_t *values, int32_t x,
+                                      int32_t count, uint8_t *row);
+TESSARINE_API int32_t BI_GetIndexRow(BI_Bitmap *bitmap, int32_t y, int32_t x, int32_t count,
+                                     uint8_t *out);
+/* Values at or above the bitmap's colorCount are set to 0 in `values` first. */
+TESSARINE_API int32_t BI_SetIndexRow(int32_t y, int32_t x, int32_t count, uint8_t *values,
+                                     BI_Bitmap *bitmap);
+TESSARINE_API int32_t BI_GetPaddedIndexRow(BI_Bitmap *bitmap, int32_t y, int32_t x, int32_t count,
+                                           uint8_t *out);
+TESSARINE_API int32_t BI_UnpackGRow(uint8_t imageType, uint8_t colorModel, uint8_t bitsPerPixel,
+                                    MEM_Handle table, const uint8_t *row, int32_t x, int32_t count,
+                                    uint8_t *out);
+TESSARINE_API int32_t BI_PackGRow(uint8_t bitsPerPixel, const uint8_t *values, int8_t x,
+                                  int32_t count, uint8_t *row);
+TESSARINE_API int32_t BI_GetGRow(BI_Bitmap *bitmap, int32_t y, int32_t x, int32_t count,
+                                 uint8_t *out);
+TESSARINE_API int32_t BI_SetGRow(int32_t y, int32_t x, int32_t count, const uint8_t *values,
+                                 BI_Bitmap *bitmap);
+TESSARINE_API int32_t BI_GetPaddedGRow(BI_Bitmap *bitmap, int32_t y, int32_t x, int32_t count,
+                                       uint8_t *out);
+TESSARINE_API int32_t BI_UnpackBWRow(const uint8_t *row, int32_t x, int32_t count, uint8_t *out);
+TESSARINE_API int32_t BI_PackBWRow(const uint8_t *flags, int32_t x, int32_t count, uint8_t *row);
+TESSARINE_API int32_t BI_GetBWRow(BI_Bitmap *bitmap, int32_t y, int32_t x, int32_t count,
+                                  uint8_t *out);
+TESSARINE_API int32_t BI_SetBWRow(int32_t y, int32_t x, int32_t count, const uint8_t *flags,
+                                  BI_Bitmap *bitmap);
+TESSARINE_API int32_t BI_GetBWPackedRow(BI_Bitmap *bitmap, int32_t y, int32_t x, int32_t count,
+                                        uint8_t *out);
+TESSARINE_API int32_t BI_SetBWPackedRow(int32_t y, int32_t x, int32_t count, const uint8_t *packed,
+                                        BI_Bitmap *bitmap);
+
 TESSARINE_END_C
 
 #endif

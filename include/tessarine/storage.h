@@ -247,6 +247,17 @@ TESSARINE_API int32_t FM_TagRewriteHdr(FM_BlockFile *file, uint32_t block, uint3
                                        FM_BlockAddr *data, FM_BlockAddr *next);
 TESSARINE_API int32_t FM_DupTagBlockFile(const char *sourcePath, const char *destinationPath);
 
+/* ---- Row and column transfer sessions ------------------------------------------ */
+
+/* flags: 1 reading, 2 writing. mode: 0 one row at a time, 1 small windows,
+   2 (and 3) bands. box null: the whole sub-bitmap. budget 0: the default. */
+TESSARINE_API int32_t HVT_TileFileRowIOBegin(uint8_t flags, BI_Bitmap *bitmap, const HVT_Box *box,
+                                             uint8_t mode, uint8_t sub, int32_t budget);
+TESSARINE_API int32_t HVT_RotatedTileFileColIOBegin(uint8_t flags, BI_Bitmap *bitmap,
+                                                    const HVT_Box *box, uint8_t mode, uint8_t sub,
+                                                    int32_t budget);
+TESSARINE_API void HVT_TileFileRowColIOEnd(BI_Bitmap *bitmap);
+
 TESSARINE_END_C
 
 #endif

@@ -9,3 +9,4 @@ void DemoGeometry();
 void DemoColor();
 void DemoTiles();
 void DemoBlockFile();
+void DemoRows();

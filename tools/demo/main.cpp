@@ -67,5 +67,6 @@ int main() {
     DemoColor();
     DemoTiles();
     DemoBlockFile();
+    DemoRows();
     return 0;
 }

@@ -1,0 +1,223 @@
+// Row access against its baselines in the same run: every row of a 16384 by
+// 16384 RGB bitmap through a band session against a raw read of its tile
+// file; the same rows in memory against memcpy; black-and-white rows
+// unpacked and packed against a memcpy of the unpacked bytes.
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstring>
+#include <string>
+#include <vector>
+
+#include <tessarine/tessarine.h>
+
+#include "bench_ratio.h"
+
+namespace {
+
+constexpr int32_t kSide = 16384;
+constexpr int64_t kRowBytes = int64_t{kSide} * 3;
+
+// The two bitmaps, made once and deleted at exit.
+struct Images {
+    BI_Bitmap *tiled = nullptr;
+    BI_Bitmap *memory = nullptr;
+    std::vector<uint8_t> r, g, b, row;
+
+    Images() : r(kSide), g(kSide), b(kSide), row(kRowBytes) {
+        for (int32_t x = 0; x < kSide; ++x) {
+            r[x] = static_cast<uint8_t>(x);
+            g[x] = static_cast<uint8_t>(x >> 3);
+            b[x] = static_cast<uint8_t>(x * 7);
+        }
+    }
+    ~Images() {
+        if (tiled) BI_DeleteBitmap(&tiled);
+        if (memory) BI_DeleteBitmap(&memory);
+    }
+    BI_Bitmap *Tiled() {
+        if (tiled) return tiled;
+        if (TS_FAILED(BI_CreateBlankBmp(4, 24, kSide, kSide, 300, 300, 1, 0, nullptr, &tiled, 2, 0, 0, 0)))
+            std::abort();
+        HVT_TileFileRowIOBegin(2, tiled, nullptr, 2, 0, 0);
+        for (int32_t y = 0; y < kSide; ++y) BI_SetRGBRow(y, 0, kSide, r.data(), g.data(), b.data(), tiled);
+        HVT_TileFileRowColIOEnd(tiled);
+        RawRead();  // into the page cache for both sides
+        return tiled;
+    }
+    BI_Bitmap *Memory() {
+        if (memory) return memory;
+        if (TS_FAILED(BI_CreateBlankBmp(4, 24, kSide, kSide, 300, 300, 1, 0, nullptr, &memory, 1, 0, 0, 0)))
+            std::abort();
+        auto *p = static_cast<uint8_t *>(MEM_Lock(memory->pixelHandle));
+        for (int32_t y = 0; y < kSide; ++y)
+            std::memset(p + int64_t{y} * memory->bytesPerRow, y & 0xFF, memory->bytesPerRow);
+        MEM_Unlock(memory->pixelHandle);
+        return memory;
+    }
+    int64_t RawRead() {
+        const int fd = ::open(tiled->tilePath, O_RDONLY);
+        static std::vector<uint8_t> chunk(1 << 20);
+        int64_t total = 0;
+        for (ssize_t n; (n = ::read(fd, chunk.data(), chunk.size())) > 0;) total += n;
+        ::close(fd);
+        return total;
+    }
+};
+
+Images &Shared() {
+    static Images images;
+    return images;
+}
+
+void BM_RawReadTileFile(benchmark::State &state) {
+    Images &im = Shared();
+    im.Tiled();
+    int64_t bytes = 0;
+    for (auto _ : state) bytes += im.RawRead();
+    state.SetBytesProcessed(bytes);
+}
+
+void BM_GetRGBRowTileSession(benchmark::State &state) {
+    Images &im = Shared();
+    BI_Bitmap *t = im.Tiled();
+    for (auto _ : state) {
+        HVT_TileFileRowIOBegin(1, t, nullptr, 2, 0, static_cast<int32_t>(state.range(0)));
+        for (int32_t y = 0; y < kSide; ++y)
+            BI_GetRGBRow(t, y, 0, kSide, im.r.data(), im.g.data(), im.b.data());
+        HVT_TileFileRowColIOEnd(t);
+        benchmark::DoNotOptimize(im.r.data());
+    }
+    state.SetBytesProcessed(state.iterations() * kRowBytes * kSide);
+}
+
+void BM_MemcpyRowsOut(benchmark::State &state) {
+    Images &im = Shared();
+    BI_Bitmap *m = im.Memory();
+    for (auto _ : state) {
+        auto *p = static_cast<uint8_t *>(MEM_Lock(m->pixelHandle));
+        for (int32_t y = 0; y < kSide; ++y)
+            std::memcpy(im.row.data(), p + int64_t{y} * m->bytesPerRow, kRowBytes);
+        MEM_Unlock(m->pixelHandle);
+        benchmark::DoNotOptimize(im.row.data());
+    }
+    state.SetBytesProcessed(state.iterations() * kRowBytes * kSide);
+}
+
+void BM_MemcpyRowsIn(benchmark::State &state) {
+    Images &im = Shared();
+    BI_Bitmap *m = im.Memory();
+    for (auto _ : state) {
+        auto *p = static_cast<uint8_t *>(MEM_Lock(m->pixelHandle));
+        for (int32_t y = 0; y < kSide; ++y)
+            std::memcpy(p + int64_t{y} * m->bytesPerRow, im.row.data(), kRowBytes);
+        MEM_Unlock(m->pixelHandle);
+        benchmark::ClobberMemory();
+    }
+    state.SetBytesProcessed(state.iterations() * kRowBytes * kSide);
+}
+
+void BM_GetRGBRowMemory(benchmark::State &state) {
+    Images &im = Shared();
+    BI_Bitmap *m = im.Memory();
+    for (auto _ : state) {
+        for (int32_t y = 0; y < kSide; ++y)
+            BI_GetRGBRow(m, y, 0, kSide, im.r.data(), im.g.data(), im.b.data());
+        benchmark::DoNotOptimize(im.r.data());
+    }
+    state.SetBytesProcessed(state.iterations() * kRowBytes * kSide);
+}
+
+void BM_SetRGBRowMemory(benchmark::State &state) {
+    Images &im = Shared();
+    BI_Bitmap *m = im.Memory();
+    for (auto _ : state) {
+        for (int32_t y = 0; y < kSide; ++y)
+            BI_SetRGBRow(y, 0, kSide, im.r.data(), im.g.data(), im.b.data(), m);
+        benchmark::ClobberMemory();
+    }
+    state.SetBytesProcessed(state.iterations() * kRowBytes * kSide);
+}
+
+constexpr int32_t kLong = 1 << 20;  // pixels of a long 1-bit row
+
+struct BwRows {
+    std::vector<uint8_t> packed, flags, copy;
+    BwRows() : packed(kLong / 8 + 2), flags(kLong + 16), copy(kLong + 16) {
+        for (size_t i = 0; i < packed.size(); ++i) packed[i] = static_cast<uint8_t>(i * 37);
+        for (size_t i = 0; i < flags.size(); ++i) flags[i] = (i * 13) & 1;
+    }
+};
+
+BwRows &Bw() {
+    static BwRows rows;
+    return rows;
+}
+
+void BM_MemcpyUnpackedBW(benchmark::State &state) {
+    BwRows &w = Bw();
+    for (auto _ : state) {
+        std::memcpy(w.copy.data(), w.flags.data(), kLong);
+        benchmark::DoNotOptimize(w.copy.data());
+    }
+    state.SetBytesProcessed(state.iterations() * kLong);
+}
+
+void BM_UnpackBWRow(benchmark::State &state) {
+    BwRows &w = Bw();
+    for (auto _ : state) {
+        BI_UnpackBWRow(w.packed.data(), 3, kLong - 3, w.copy.data());
+        benchmark::DoNotOptimize(w.copy.data());
+    }
+    state.SetBytesProcessed(state.iterations() * kLong);
+}
+
+void BM_PackBWRow(benchmark::State &state) {
+    BwRows &w = Bw();
+    for (auto _ : state) {
+        BI_PackBWRow(w.flags.data(), 3, kLong - 3, w.packed.data());
+        benchmark::DoNotOptimize(w.packed.data());
+    }
+    state.SetBytesProcessed(state.iterations() * kLong);
+}
+
+BENCHMARK(BM_RawReadTileFile)->Unit(benchmark::kMillisecond)->MinTime(2);
+// The default budget (bands of 512 rows here) and budgets whose bands stay in cache.
+BENCHMARK(BM_GetRGBRowTileSession)->Unit(benchmark::kMillisecond)->MinTime(2)->Arg(0)->Arg(1 << 20)->Arg(4 << 20);
+BENCHMARK(BM_MemcpyRowsOut)->Unit(benchmark::kMillisecond)->MinTime(1);
+BENCHMARK(BM_GetRGBRowMemory)->Unit(benchmark::kMillisecond)->MinTime(1);
+BENCHMARK(BM_MemcpyRowsIn)->Unit(benchmark::kMillisecond)->MinTime(1);
+BENCHMARK(BM_SetRGBRowMemory)->Unit(benchmark::kMillisecond)->MinTime(1);
+BENCHMARK(BM_MemcpyUnpackedBW)->MinTime(0.5);
+BENCHMARK(BM_UnpackBWRow)->MinTime(0.5);
+BENCHMARK(BM_PackBWRow)->MinTime(0.5);
+
+const bool kRatios = [] {
+    for (const char *budget : {"0", "1048576", "4194304"})
+        tsbench::AddRatio(std::string("BM_GetRGBRowTileSession/") + budget + "/min_time:2.000",
+                          "BM_RawReadTileFile/min_time:2.000", 0.7);
+    tsbench::AddRatio("BM_GetRGBRowMemory/min_time:1.000", "BM_MemcpyRowsOut/min_time:1.000", 0.5);
+    tsbench::AddRatio("BM_SetRGBRowMemory/min_time:1.000", "BM_MemcpyRowsIn/min_time:1.000", 0.5);
+    tsbench::AddRatio("BM_UnpackBWRow/min_time:0.500", "BM_MemcpyUnpackedBW/min_time:0.500");
+    tsbench::AddRatio("BM_PackBWRow/min_time:0.500", "BM_MemcpyUnpackedBW/min_time:0.500");
+    return true;
+}();
+
+}  // namespace
+
+TSBENCH_MAIN()
+namespace {
+void BM_BandReadsOnly(benchmark::State &state) {
+    Images &im = Shared();
+    BI_Bitmap *t = im.Tiled();
+    for (auto _ : state) {
+        HVT_TileFileRowIOBegin(1, t, nullptr, 2, 0, static_cast<int32_t>(state.range(0)));
+        const int32_t rows = t->ioSession->bandRows;
+        for (int32_t y = 0; y < kSide; y += rows)
+            BI_GetRGBRow(t, y, 0, 16, im.r.data(), im.g.data(), im.b.data());
+        HVT_TileFileRowColIOEnd(t);
+    }
+}
+BENCHMARK(BM_BandReadsOnly)->Unit(benchmark::kMillisecond)->Arg(0)->Arg(1 << 21);
+}

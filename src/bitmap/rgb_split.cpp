@@ -1,0 +1,203 @@
+// 3-byte pixels to planes and back. The vector path moves 16 pixels at a
+// time through byte shuffles; the plain path is beside it for the rest of a
+// row and for processors without them.
+#include "bitmap/rgb_split.h"
+
+#include <array>
+#include <utility>
+
+#if defined(__x86_64__) || defined(__i386__)
+#include <immintrin.h>
+#define TESSARINE_SHUFFLE_PATH 1
+#endif
+
+namespace tessarine::bitmap {
+namespace {
+
+void SplitPlain(const uint8_t *s, int64_t n, uint8_t *r, uint8_t *g, uint8_t *b) {
+    for (int64_t i = 0; i < n; ++i, s += 3) {
+        r[i] = s[0];
+        g[i] = s[1];
+        b[i] = s[2];
+    }
+}
+
+void JoinPlain(const uint8_t *r, const uint8_t *g, const uint8_t *b, int64_t n, uint8_t *d) {
+    for (int64_t i = 0; i < n; ++i, d += 3) {
+        d[0] = r[i];
+        d[1] = g[i];
+        d[2] = b[i];
+    }
+}
+
+void SplitCmykPlain(const uint8_t *s, int64_t n, uint8_t *const p[4]) {
+    for (int64_t i = 0; i < n; ++i, s += 4) {
+        p[0][i] = s[0];
+        p[1][i] = s[1];
+        p[2][i] = s[2];
+        p[3][i] = s[3];
+    }
+}
+
+void JoinCmykPlain(const uint8_t *const p[4], int64_t n, uint8_t *d) {
+    for (int64_t i = 0; i < n; ++i, d += 4) {
+        d[0] = p[0][i];
+        d[1] = p[1][i];
+        d[2] = p[2][i];
+        d[3] = p[3][i];
+    }
+}
+
+#ifdef TESSARINE_SHUFFLE_PATH
+
+using Mask = std::array<int8_t, 16>;
+
+// Gathers channel c of 16 pixels from the k-th of three 16-byte pieces.
+constexpr Mask SplitMask(int c, int k) {
+    Mask m{};
+    for (int i = 0; i < 16; ++i) {
+        const int s = 3 * i + c;
+        m[i] = static_cast<int8_t>(s / 16 == k ? s % 16 : -128);
+    }
+    return m;
+}
+
+// Places channel c of 16 pixels into the k-th 16-byte piece of the output.
+constexpr Mask JoinMask(int c, int k) {
+    Mask m{};
+    for (int j = 0; j < 16; ++j) {
+        const int o = 16 * k + j;
+        m[j] = static_cast<int8_t>(o % 3 == c ? o / 3 : -128);
+    }
+    return m;
+}
+
+template <class F, size_t... I>
+constexpr auto Table(F f, std::index_sequence<I...>) {
+    return std::array<Mask, sizeof...(I)>{f(static_cast<int>(I) / 3, static_cast<int>(I) % 3)...};
+}
+
+alignas(16) constexpr auto kSplit = Table(SplitMask, std::make_index_sequence<9>{});
+alignas(16) constexpr auto kJoin = Table(JoinMask, std::make_index_sequence<9>{});
+
+__attribute__((target("ssse3"))) inline __m128i Load(const Mask &m) {
+    return _mm_loadu_si128(reinterpret_cast<const __m128i *>(m.data()));
+}
+
+__attribute__((target("ssse3"))) void SplitShuffled(const uint8_t *s, int64_t n, uint8_t *r,
+                                                    uint8_t *g, uint8_t *b) {
+    __m128i m[9];
+    for (int i = 0; i < 9; ++i) m[i] = Load(kSplit[i]);
+    uint8_t *planes[3] = {r, g, b};
+    int64_t i = 0;
+    for (; i + 16 <= n; i += 16, s += 48) {
+        const __m128i a = _mm_loadu_si128(reinterpret_cast<const __m128i *>(s));
+        const __m128i c = _mm_loadu_si128(reinterpret_cast<const __m128i *>(s + 16));
+        const __m128i e = _mm_loadu_si128(reinterpret_cast<const __m128i *>(s + 32));
+        for (int ch = 0; ch < 3; ++ch) {
+            const __m128i v = _mm_or_si128(
+                _mm_or_si128(_mm_shuffle_epi8(a, m[3 * ch]), _mm_shuffle_epi8(c, m[3 * ch + 1])),
+                _mm_shuffle_epi8(e, m[3 * ch + 2]));
+            _mm_storeu_si128(reinterpret_cast<__m128i *>(planes[ch] + i), v);
+        }
+    }
+    SplitPlain(s, n - i, r + i, g + i, b + i);
+}
+
+__attribute__((target("ssse3"))) void JoinShuffled(const uint8_t *r, const uint8_t *g,
+                                                   const uint8_t *b, int64_t n, uint8_t *d) {
+    __m128i m[9];
+    for (int i = 0; i < 9; ++i) m[i] = Load(kJoin[i]);
+    int64_t i = 0;
+    for (; i + 16 <= n; i += 16, d += 48) {
+        const __m128i vr = _mm_loadu_si128(reinterpret_cast<const __m128i *>(r + i));
+        const __m128i vg = _mm_loadu_si128(reinterpret_cast<const __m128i *>(g + i));
+        const __m128i vb = _mm_loadu_si128(reinterpret_cast<const __m128i *>(b + i));
+        for (int k = 0; k < 3; ++k) {
+            const __m128i v = _mm_or_si128(
+                _mm_or_si128(_mm_shuffle_epi8(vr, m[k]), _mm_shuffle_epi8(vg, m[3 + k])),
+                _mm_shuffle_epi8(vb, m[6 + k]));
+            _mm_storeu_si128(reinterpret_cast<__m128i *>(d + 16 * k), v);
+        }
+    }
+    JoinPlain(r + i, g + i, b + i, n - i, d);
+}
+
+// 16 pixels of 4 bytes: each 4-pixel piece is grouped by channel with a
+// shuffle, then the 4 by 4 words are transposed.
+__attribute__((target("ssse3"))) void SplitCmykShuffled(const uint8_t *s, int64_t n,
+                                                        uint8_t *const p[4]) {
+    const __m128i group = _mm_setr_epi8(0, 4, 8, 12, 1, 5, 9, 13, 2, 6, 10, 14, 3, 7, 11, 15);
+    int64_t i = 0;
+    for (; i + 16 <= n; i += 16, s += 64) {
+        __m128i v[4];
+        for (int k = 0; k < 4; ++k)
+            v[k] = _mm_shuffle_epi8(_mm_loadu_si128(reinterpret_cast<const __m128i *>(s + 16 * k)), group);
+        const __m128i t0 = _mm_unpacklo_epi32(v[0], v[1]);  // c0 c1 m0 m1
+        const __m128i t1 = _mm_unpackhi_epi32(v[0], v[1]);  // y0 y1 k0 k1
+        const __m128i t2 = _mm_unpacklo_epi32(v[2], v[3]);
+        const __m128i t3 = _mm_unpackhi_epi32(v[2], v[3]);
+        _mm_storeu_si128(reinterpret_cast<__m128i *>(p[0] + i), _mm_unpacklo_epi64(t0, t2));
+        _mm_storeu_si128(reinterpret_cast<__m128i *>(p[1] + i), _mm_unpackhi_epi64(t0, t2));
+        _mm_storeu_si128(reinterpret_cast<__m128i *>(p[2] + i), _mm_unpacklo_epi64(t1, t3));
+        _mm_storeu_si128(reinterpret_cast<__m128i *>(p[3] + i), _mm_unpackhi_epi64(t1, t3));
+    }
+    const uint8_t *rest[4] = {p[0] + i, p[1] + i, p[2] + i, p[3] + i};
+    SplitCmykPlain(s, n - i, const_cast<uint8_t *const *>(rest));
+}
+
+__attribute__((target("ssse3"))) void JoinCmykShuffled(const uint8_t *const p[4], int64_t n,
+                                                       uint8_t *d) {
+    const __m128i spread = _mm_setr_epi8(0, 4, 8, 12, 1, 5, 9, 13, 2, 6, 10, 14, 3, 7, 11, 15);
+    int64_t i = 0;
+    for (; i + 16 <= n; i += 16, d += 64) {
+        const __m128i c = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p[0] + i));
+        const __m128i m = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p[1] + i));
+        const __m128i y = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p[2] + i));
+        const __m128i k = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p[3] + i));
+        const __m128i cm0 = _mm_unpacklo_epi32(c, m), cm1 = _mm_unpackhi_epi32(c, m);
+        const __m128i yk0 = _mm_unpacklo_epi32(y, k), yk1 = _mm_unpackhi_epi32(y, k);
+        const __m128i v[4] = {_mm_unpacklo_epi64(cm0, yk0), _mm_unpackhi_epi64(cm0, yk0),
+                              _mm_unpacklo_epi64(cm1, yk1), _mm_unpackhi_epi64(cm1, yk1)};
+        for (int q = 0; q < 4; ++q)
+            _mm_storeu_si128(reinterpret_cast<__m128i *>(d + 16 * q), _mm_shuffle_epi8(v[q], spread));
+    }
+    const uint8_t *rest[4] = {p[0] + i, p[1] + i, p[2] + i, p[3] + i};
+    JoinCmykPlain(rest, n - i, d);
+}
+
+const bool kHasShuffle = __builtin_cpu_supports("ssse3");
+
+#endif
+
+}  // namespace
+
+void SplitRgb(const uint8_t *pixels, int64_t count, uint8_t *r, uint8_t *g, uint8_t *b) {
+#ifdef TESSARINE_SHUFFLE_PATH
+    if (kHasShuffle) return SplitShuffled(pixels, count, r, g, b);
+#endif
+    SplitPlain(pixels, count, r, g, b);
+}
+
+void JoinRgb(const uint8_t *r, const uint8_t *g, const uint8_t *b, int64_t count, uint8_t *pixels) {
+#ifdef TESSARINE_SHUFFLE_PATH
+    if (kHasShuffle) return JoinShuffled(r, g, b, count, pixels);
+#endif
+    JoinPlain(r, g, b, count, pixels);
+}
+
+void SplitCmyk(const uint8_t *pixels, int64_t count, uint8_t *const planes[4]) {
+#ifdef TESSARINE_SHUFFLE_PATH
+    if (kHasShuffle) return SplitCmykShuffled(pixels, count, planes);
+#endif
+    SplitCmykPlain(pixels, count, planes);
+}
+
+void JoinCmyk(const uint8_t *const planes[4], int64_t count, uint8_t *pixels) {
+#ifdef TESSARINE_SHUFFLE_PATH
+    if (kHasShuffle) return JoinCmykShuffled(planes, count, pixels);
+#endif
+    JoinCmykPlain(planes, count, pixels);
+}
+
+}  // namespace tessarine::bitmap
