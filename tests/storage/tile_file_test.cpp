@@ -227,6 +227,27 @@ TEST_F(TileFileTest, EndOffsetPastThirtyTwoBitsIsMinus40ByAnyAmount) {
     EXPECT_EQ(st.st_size, int64_t{INT32_MAX} + 1);
 }
 
+TEST_F(TileFileTest, AddSubbmpAllocatesItsTableBeforeJudgingTheEnd) {
+    ASSERT_EQ(Create(8, 4, 4), TS_OK);
+    HVT_FileHeader h = HeaderOf();
+    const HVT_FileHeader saved = h;
+    const auto before = FileBytes(path_);
+    // 70000 by 70000 at 8 bits passes the limit, but its table of 9 by 69
+    // tiles is asked for first: without memory the status is -5.
+    tessarine::testing::FailAllocationAt(1);
+    EXPECT_EQ(HVT_AddSubbmp(fd_, &h, 70000, 70000, nullptr, nullptr), -5);
+    EXPECT_TRUE(tessarine::testing::AllocationFailureHit());
+    tessarine::testing::ResetInjection();
+    EXPECT_EQ(HVT_AddSubbmp(fd_, &h, 70000, 70000, nullptr, nullptr), -40);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 1);
+    // A table that no 32-bit size holds is -40 without asking.
+    tessarine::testing::ResetInjection();
+    EXPECT_EQ(HVT_AddSubbmp(fd_, &h, 0xFFFFFFFFu, 0xFFFFFFFFu, nullptr, nullptr), -40);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 0);
+    EXPECT_EQ(std::memcmp(&h, &saved, sizeof h), 0);
+    EXPECT_EQ(FileBytes(path_), before);
+}
+
 TEST_F(TileFileTest, CreateTooLargeDeletesTheFileAndKeepsTheDescriptor) {
     EXPECT_EQ(Create(32, 40000, 40000), -40);
     EXPECT_GT(fd_, 0) << "the descriptor is left to the caller";
