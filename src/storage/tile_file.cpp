@@ -64,9 +64,10 @@ int32_t OpenFileState(const char *path, int32_t openFile, HVT_FileInfo *info) {
         const int32_t entry = ts::ColorEntryBytes(header.colorModel);
         if (entry == 0) return kErrUnsupported;
         const int64_t bytes = int64_t{header.colorCount} * entry;
-        // A table longer than the file could never be read: refuse it before
-        // allocating for it.
-        if (bytes > ts::FileLength(fd) - ts::kFileHeaderBytes) return kErrFileAccess;
+        // A table longer than the file, or than one read moves, could never be
+        // read: refuse it before allocating for it.
+        if (bytes > ts::FileLength(fd) - ts::kFileHeaderBytes || bytes > kMaxOffset)
+            return kErrFileAccess;
         if (info->colorTable == nullptr) {
             info->colorTable = static_cast<uint8_t *>(MEM_AllocPtr(0, static_cast<uint32_t>(bytes)));
             if (info->colorTable == nullptr) return kErrMemory;

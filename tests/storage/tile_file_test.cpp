@@ -571,6 +571,39 @@ TEST_F(TileOpenTest, TileTableThatCannotFitTheFileIsRefused) {
     HVT_TileFileEnd(&info, 0);
 }
 
+// Counts that fit a large (sparse) file but not one read are refused before
+// anything is allocated for them, so no shorter block stands for them.
+TEST_F(TileOpenTest, TablesPastOneReadAreRefusedOnALargeFile) {
+    ASSERT_EQ(Create(8, 10, 10), TS_OK);
+    ASSERT_EQ(::ftruncate(fd_, int64_t{6} << 30), 0);
+    const int32_t manyTiles[2] = {0x10000, 0x1000};  // 2^28 tiles: 5 GiB of table
+    Poke(80 + 8, manyTiles, 8);
+    HVT_FileInfo info;
+    HVT_InitFileInfo(&info);
+    BI_Bitmap view = View(fd_);
+    ASSERT_EQ(HVT_TileFileBegin(&view, &info, 0), TS_OK);
+    tessarine::testing::ResetInjection();
+    EXPECT_EQ(HVT_GetSubbmpTileHdrs(0, &info), -50);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 0);
+    EXPECT_EQ(info.subbmps[0].tileHdrs, nullptr);
+    const HVT_Box box{0, 0, 10, 10};
+    uint8_t buf[200];
+    EXPECT_EQ(HVT_ReadBlock(0, &info, &box, 20, buf), -50);
+    HVT_TileFileEnd(&info, 0);
+
+    // 0x50000000 CMYK entries: 5 GiB of colour table.
+    const uint8_t cmyk = 2;
+    const int32_t colors = 0x50000000;
+    Poke(28, &cmyk, 1);
+    Poke(32, &colors, 4);
+    HVT_InitFileInfo(&info);
+    tessarine::testing::ResetInjection();
+    EXPECT_EQ(HVT_TileFileBegin(&view, &info, 0), -50);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 1) << "the header only";
+    EXPECT_EQ(info.header, nullptr);
+    EXPECT_EQ(info.colorTable, nullptr);
+}
+
 TEST_F(TileOpenTest, HostileTileRecordsAreRefusedWhenUsed) {
     ASSERT_EQ(Create(8, 10, 10), TS_OK);
     const int32_t wide[5] = {116, -100000, 0, 2000000000, 10};
