@@ -176,6 +176,17 @@ TEST_F(RawFile, SeekTakesOriginBeforeOffsetAndMayPassTheEnd) {
     FM_Delete(p.c_str());
 }
 
+TEST_F(RawFile, ShortWriteIsMinus50AndLeavesTheDescriptorOpen) {
+    int32_t fd = -1;
+    ASSERT_EQ(FM_Open("/dev/full", 2, &fd), TS_OK);
+    FM_LastErrno = 0;
+    EXPECT_EQ(FM_Write(fd, "abc", 3), -50) << "a full disk is no status of its own here";
+    EXPECT_EQ(FM_LastErrno, ENOSPC);
+    EXPECT_EQ(FM_SeekAndWrite(fd, 0, 0, "abc", 3), -50);
+    EXPECT_EQ(::fcntl(fd, F_GETFD), FD_CLOEXEC) << "nothing here closes a file on failure";
+    EXPECT_EQ(FM_Close(fd), TS_OK);
+}
+
 TEST_F(RawFile, CloseOfZeroOrBelowSucceedsSilently) {
     FM_LastErrno = 77;
     EXPECT_EQ(FM_Close(0), TS_OK);

@@ -398,6 +398,29 @@ TEST_F(TileOpenTest, UsesTheOwnersDescriptorAndLeavesItOpen) {
     EXPECT_EQ(FM_Seek(fd_, 0, 0), TS_OK) << "still open";
 }
 
+TEST_F(TileOpenTest, EndReleasesTheSessionBuffers) {
+    ASSERT_EQ(Create(8, 10, 10), TS_OK);
+    HVT_FileInfo info;
+    HVT_InitFileInfo(&info);
+    BI_Bitmap view = View(fd_);
+    ASSERT_EQ(HVT_TileFileBegin(&view, &info, 0), TS_OK);
+    ASSERT_EQ(HVT_GetSubbmpTileHdrs(0, &info), TS_OK);
+    info.readHandle = MEM_AllocHdl(0, 64);
+    info.writeHandle = MEM_AllocHdl(0, 32);
+    ASSERT_NE(info.readHandle, nullptr);
+    ASSERT_NE(info.writeHandle, nullptr);
+    info.readBuffer = static_cast<uint8_t *>(MEM_Lock(info.readHandle));
+    info.writeBuffer = static_cast<uint8_t *>(MEM_Lock(info.writeHandle));
+    HVT_TileFileEnd(&info, 0);  // locked handles are unlocked and freed: the Sandbox sees no leak
+    EXPECT_EQ(info.readHandle, nullptr);
+    EXPECT_EQ(info.writeHandle, nullptr);
+    EXPECT_EQ(info.readBuffer, nullptr);
+    EXPECT_EQ(info.writeBuffer, nullptr);
+    EXPECT_EQ(info.subbmps[0].tileHdrs, nullptr);
+    EXPECT_EQ(info.tileBuffer, nullptr);
+    EXPECT_EQ(info.descriptor, fd_);
+}
+
 TEST_F(TileOpenTest, CorruptedStampOpensWithoutComplaint) {
     ASSERT_EQ(Create(8, 10, 10), TS_OK);
     const uint8_t junk[6] = {0xFF, 0xFE, 0xFD, 0, 0, 0};
