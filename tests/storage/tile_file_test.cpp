@@ -313,12 +313,24 @@ TEST_F(TileFileTest, AddSubbmpFailuresLeaveTheHeaderAsStated) {
     tstest::ForEachFileFailure(FileCall::Write, [&](int64_t n) {
         HVT_FileHeader h = start;
         uint8_t index = 99;
-        const int32_t s = HVT_AddSubbmp(fd_, &h, 20, 20, nullptr, &index);
+        HVT_SubbmpHdr hdr{-1, -1, -1, -1};
+        const int32_t s = HVT_AddSubbmp(fd_, &h, 20, 20, &hdr, &index);
         if (!tessarine::testing::FileFailureHit(FileCall::Write)) return;
         EXPECT_EQ(s, -50);
         EXPECT_EQ(index, 1) << "the number is stored first";
-        // writes 1 and 2 (sub-bitmap header, table) come before the count goes up
+        EXPECT_EQ(hdr.width, -1) << "the header out place only on success";
+        // writes 1 and 2 (sub-bitmap header, table) come before the count goes up;
+        // after a failed '.' or header write the memory is one sub-bitmap ahead
         EXPECT_EQ(h.subbmpCount, n <= 2 ? 1 : 2) << n;
+        EXPECT_EQ(h.subbmpOffset[2], n <= 2 ? 0 : 10116 + 16 + 20 + 400) << n;
+    });
+    tstest::ForEachFileFailure(FileCall::Seek, [&](int64_t n) {
+        HVT_FileHeader h = start;
+        const int32_t s = HVT_AddSubbmp(fd_, &h, 20, 20, nullptr, nullptr);
+        if (!tessarine::testing::FileFailureHit(FileCall::Seek)) return;
+        EXPECT_EQ(s, -50);
+        // seeks: sub-bitmap header, '.', file header
+        EXPECT_EQ(h.subbmpCount, n <= 1 ? 1 : 2) << n;
     });
     tstest::ForEachAllocationFailure([&](int64_t) {
         HVT_FileHeader h = start;
