@@ -342,6 +342,22 @@ TEST_F(RawFile, ScratchPathLongerThanTheFieldIsRefused) {
     for (auto it = made.rbegin(); it != made.rend(); ++it) ::rmdir(it->c_str());
 }
 
+TEST_F(RawFile, ScratchFileThatCannotBeOpenedLeavesNoPath) {
+    // A directory where nothing can be made, not even by root.
+    setenv("TMPDIR", "/proc", 1);
+    char path[513] = "untouched";
+    int32_t fd = 7;
+    EXPECT_EQ(st::FM_CreateScratchFile(path, &fd), -50);
+    EXPECT_EQ(fd, -1) << "the runtime's result is stored";
+    EXPECT_EQ(path[0], '\0') << "the name is not ours to delete";
+    char tilePath[513] = "";
+    fd = -1;
+    EXPECT_EQ(HVT_CreateBlankTileBmpFile(2, 8, 4, 4, 1, 1, 0, 0, nullptr, tilePath, &fd, 1, 0, 0),
+              -1);
+    EXPECT_EQ(tilePath[0], '\0');
+    setenv("TMPDIR", Dir().c_str(), 1);
+}
+
 TEST_F(RawFile, ScratchNameAllocationFailureIsMinus50) {
     tstest::ForEachAllocationFailure([&](int64_t) {
         char path[513];
