@@ -670,6 +670,21 @@ TEST_F(TileFileTest, TileRowsAreWrittenAndReadWhole) {
     ASSERT_EQ(HVT_SaveTile(0, f.Info(), 1, 17, 2, small), TS_OK);  // 5 pixels: 1 byte
     EXPECT_EQ(FileBytes(f.Path())[first + 1024 * 20 + 18], 0xCD);
     EXPECT_EQ(HVT_ReadTile(0, f.Info(), 2, 0, 1, back), -4) << "outside the table";
+    // A table not yet loaded is loaded first; without memory that is -5.
+    HVT_FileInfo *info = f.Info();
+    auto drop = [&] {
+        MEM_FreeHdl(info->subbmps[0].tileHdrs);
+        info->subbmps[0].tileHdrs = nullptr;
+    };
+    drop();
+    for (int write = 0; write < 2; ++write) {
+        tstest::ForEachAllocationFailure([&](int64_t) {
+            const int32_t s = write ? HVT_SaveTile(0, info, 0, 0, 2, rows)
+                                    : HVT_ReadTile(0, info, 0, 0, 2, back);
+            EXPECT_EQ(s, tessarine::testing::AllocationFailureHit() ? -5 : TS_OK);
+            drop();
+        });
+    }
     for (FileCall kind : {FileCall::Read, FileCall::Seek}) {
         tstest::ForEachFileFailure(kind, [&](int64_t) {
             const int32_t s = HVT_ReadTile(0, f.Info(), 0, 0, 2, back);
