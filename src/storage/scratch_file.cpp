@@ -28,7 +28,13 @@ int16_t FM_CreateScratchFile(char *path, int32_t *fd) {
     FM_CopyPath(name, path);
     *fd = platform::_open(path, kScratchFlags, kOwnerReadWrite);
     platform::GlobalFree(name);
-    return *fd < 1 ? kErrFileAccess : kOk;
+    if (*fd < 1) {
+        // The exclusive open failed: whatever has that name is not ours, and
+        // a caller that deletes a set path after a failure must leave it be.
+        path[0] = '\0';
+        return kErrFileAccess;
+    }
+    return kOk;
 }
 
 void FM_CopyPath(const char *source, char *destination) {

@@ -64,9 +64,10 @@ int32_t OpenFileState(const char *path, int32_t openFile, HVT_FileInfo *info) {
         const int32_t entry = ts::ColorEntryBytes(header.colorModel);
         if (entry == 0) return kErrUnsupported;
         const int64_t bytes = int64_t{header.colorCount} * entry;
-        // A table longer than the file could never be read: refuse it before
-        // allocating for it.
-        if (bytes > ts::FileLength(fd) - ts::kFileHeaderBytes) return kErrFileAccess;
+        // A table longer than the file, or than one read moves, could never be
+        // read: refuse it before allocating for it.
+        if (bytes > ts::FileLength(fd) - ts::kFileHeaderBytes || bytes > kMaxOffset)
+            return kErrFileAccess;
         if (info->colorTable == nullptr) {
             info->colorTable = static_cast<uint8_t *>(MEM_AllocPtr(0, static_cast<uint32_t>(bytes)));
             if (info->colorTable == nullptr) return kErrMemory;
@@ -129,12 +130,13 @@ TESSARINE_API int32_t HVT_AddSubbmp(int32_t fd, HVT_FileHeader *header, uint32_t
     const int64_t dataBytes = width == 0 || height == 0 ? -1 : TileDataBytes(width, height, d);
     const int64_t start = header->subbmpOffset[count];
     const int64_t end = start + ts::kSubbmpHdrBytes + tableBytes + dataBytes;
-    // Past what a signed 32-bit offset reaches, by any amount: nothing is made.
-    if (dataBytes < 0 || tableBytes > kMaxOffset || end <= 0 || end > kMaxOffset)
-        return kErrTooLarge;
-
+    // A table past any 32-bit size is past the offset limit as well.
+    if (tableBytes > kMaxOffset) return kErrTooLarge;
+    // The table is had before the end is judged: without memory the status is -5.
     ts::ScopedBlock table(MEM_AllocPtr(0, static_cast<uint32_t>(tableBytes)));
     if (table.Get() == nullptr) return kErrMemory;
+    // Past what a signed 32-bit offset reaches, by any amount: nothing is written.
+    if (dataBytes < 0 || end <= 0 || end > kMaxOffset) return kErrTooLarge;
     auto *entry = static_cast<uint8_t *>(table.Get());
     int64_t running = start + tableBytes + ts::kSubbmpHdrBytes;
     for (int64_t top = 0; top < height; top += ts::kTileHeight) {

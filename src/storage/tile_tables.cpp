@@ -48,11 +48,12 @@ TESSARINE_API int32_t HVT_GetSubbmpTileHdrs(uint8_t sub, HVT_FileInfo *info) {
     if (slot.tilesAcross < 0 || slot.tilesDown < 0) return kErrFileAccess;
     const int64_t count = int64_t{slot.tilesAcross} * slot.tilesDown;
     const int64_t at = int64_t{info->header->subbmpOffset[sub]} + ts::kSubbmpHdrBytes;
-    // A table that runs past the end of the file could not be read: refuse it
-    // before allocating for it.
+    // A table that runs past the end of the file, or past what one read
+    // moves, could not be read: refuse it before allocating for it.
     if (at < 0 || at > INT32_MAX || count > (ts::FileLength(info->descriptor) - at) / ts::kTileHdrBytes)
         return kErrFileAccess;
     const int64_t bytes = count * ts::kTileHdrBytes;
+    if (bytes > INT32_MAX) return kErrFileAccess;
     slot.tileHdrs = static_cast<HVT_TileHdr *>(MEM_AllocPtr(MEM_FLAG_ZERO, static_cast<uint32_t>(bytes)));
     if (slot.tileHdrs == nullptr) return kErrMemory;
     // A failed read keeps the table, so that it is not tried again.

@@ -186,6 +186,21 @@ TEST_F(Bitmap, BlankCopyOfAnIndexedBitmapOwnsItsTable) {
     BI_DeleteBitmap(&src);
 }
 
+TEST_F(Bitmap, BlankCopyOfATableWithAnUnknownModelIsMinus2) {
+    const uint8_t rgb[6] = {10, 20, 30, 40, 50, 60};
+    BI_Bitmap *src = Create(3, 8, 8, 8, 1, 1, 2, rgb);
+    ASSERT_NE(src, nullptr);
+    src->colorModel = 7;
+    const RECT r{0, 0, 4, 4};
+    for (uint8_t storage : {1, 2}) {
+        BI_Bitmap *b = reinterpret_cast<BI_Bitmap *>(0x1);
+        EXPECT_EQ(BI_GetBlankBmp(src, &r, &b, storage), -2);
+        EXPECT_EQ(b, reinterpret_cast<BI_Bitmap *>(0x1)) << "out unwritten";
+    }
+    EXPECT_TRUE(tstest::DirectoryEntries(Dir()).empty()) << "no tile file made";
+    BI_DeleteBitmap(&src);
+}
+
 TEST_F(Bitmap, BlankCopyDoesNotRejectNegativeSizes) {
     BI_Bitmap *src = Create(2, 8, 10, 10, 1);
     BI_Bitmap *b = nullptr;
@@ -273,6 +288,19 @@ TEST_F(Bitmap, DeleteRemovesTheCompanionFile) {
     std::snprintf(b->companionPath, sizeof b->companionPath, "%s", companion.c_str());
     BI_DeleteBitmap(&b);
     EXPECT_FALSE(Exists(companion.c_str()));
+}
+
+TEST_F(Bitmap, DeleteDoesNotLookAtFailedRemovals) {
+    BI_Bitmap *b = Create(2, 8, 4, 4, 2);
+    ASSERT_NE(b, nullptr);
+    const std::string path = b->tilePath;
+    ASSERT_EQ(FM_Delete(b->tilePath), TS_OK);  // gone already: FM_Delete fails inside
+    std::snprintf(b->companionPath, sizeof b->companionPath, "%s", Path("never-made").c_str());
+    const int fds = tstest::OpenDescriptorCount();
+    BI_DeleteBitmap(&b);
+    EXPECT_EQ(b, nullptr);
+    EXPECT_EQ(tstest::OpenDescriptorCount(), fds - 1) << "the tile file was still closed";
+    EXPECT_FALSE(Exists(path.c_str()));
 }
 
 TEST_F(Bitmap, TileFileBitmapRoundTripsPixels) {

@@ -176,6 +176,17 @@ TEST_F(RawFile, SeekTakesOriginBeforeOffsetAndMayPassTheEnd) {
     FM_Delete(p.c_str());
 }
 
+TEST_F(RawFile, ShortWriteIsMinus50AndLeavesTheDescriptorOpen) {
+    int32_t fd = -1;
+    ASSERT_EQ(FM_Open("/dev/full", 2, &fd), TS_OK);
+    FM_LastErrno = 0;
+    EXPECT_EQ(FM_Write(fd, "abc", 3), -50) << "a full disk is no status of its own here";
+    EXPECT_EQ(FM_LastErrno, ENOSPC);
+    EXPECT_EQ(FM_SeekAndWrite(fd, 0, 0, "abc", 3), -50);
+    EXPECT_EQ(::fcntl(fd, F_GETFD), FD_CLOEXEC) << "nothing here closes a file on failure";
+    EXPECT_EQ(FM_Close(fd), TS_OK);
+}
+
 TEST_F(RawFile, CloseOfZeroOrBelowSucceedsSilently) {
     FM_LastErrno = 77;
     EXPECT_EQ(FM_Close(0), TS_OK);
@@ -329,6 +340,22 @@ TEST_F(RawFile, ScratchPathLongerThanTheFieldIsRefused) {
     EXPECT_EQ(fd, -7);
     setenv("TMPDIR", Dir().c_str(), 1);
     for (auto it = made.rbegin(); it != made.rend(); ++it) ::rmdir(it->c_str());
+}
+
+TEST_F(RawFile, ScratchFileThatCannotBeOpenedLeavesNoPath) {
+    // A directory where nothing can be made, not even by root.
+    setenv("TMPDIR", "/proc", 1);
+    char path[513] = "untouched";
+    int32_t fd = 7;
+    EXPECT_EQ(st::FM_CreateScratchFile(path, &fd), -50);
+    EXPECT_EQ(fd, -1) << "the runtime's result is stored";
+    EXPECT_EQ(path[0], '\0') << "the name is not ours to delete";
+    char tilePath[513] = "";
+    fd = -1;
+    EXPECT_EQ(HVT_CreateBlankTileBmpFile(2, 8, 4, 4, 1, 1, 0, 0, nullptr, tilePath, &fd, 1, 0, 0),
+              -1);
+    EXPECT_EQ(tilePath[0], '\0');
+    setenv("TMPDIR", Dir().c_str(), 1);
 }
 
 TEST_F(RawFile, ScratchNameAllocationFailureIsMinus50) {

@@ -227,6 +227,27 @@ TEST_F(TileFileTest, EndOffsetPastThirtyTwoBitsIsMinus40ByAnyAmount) {
     EXPECT_EQ(st.st_size, int64_t{INT32_MAX} + 1);
 }
 
+TEST_F(TileFileTest, AddSubbmpAllocatesItsTableBeforeJudgingTheEnd) {
+    ASSERT_EQ(Create(8, 4, 4), TS_OK);
+    HVT_FileHeader h = HeaderOf();
+    const HVT_FileHeader saved = h;
+    const auto before = FileBytes(path_);
+    // 70000 by 70000 at 8 bits passes the limit, but its table of 9 by 69
+    // tiles is asked for first: without memory the status is -5.
+    tessarine::testing::FailAllocationAt(1);
+    EXPECT_EQ(HVT_AddSubbmp(fd_, &h, 70000, 70000, nullptr, nullptr), -5);
+    EXPECT_TRUE(tessarine::testing::AllocationFailureHit());
+    tessarine::testing::ResetInjection();
+    EXPECT_EQ(HVT_AddSubbmp(fd_, &h, 70000, 70000, nullptr, nullptr), -40);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 1);
+    // A table that no 32-bit size holds is -40 without asking.
+    tessarine::testing::ResetInjection();
+    EXPECT_EQ(HVT_AddSubbmp(fd_, &h, 0xFFFFFFFFu, 0xFFFFFFFFu, nullptr, nullptr), -40);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 0);
+    EXPECT_EQ(std::memcmp(&h, &saved, sizeof h), 0);
+    EXPECT_EQ(FileBytes(path_), before);
+}
+
 TEST_F(TileFileTest, CreateTooLargeDeletesTheFileAndKeepsTheDescriptor) {
     EXPECT_EQ(Create(32, 40000, 40000), -40);
     EXPECT_GT(fd_, 0) << "the descriptor is left to the caller";
@@ -292,12 +313,24 @@ TEST_F(TileFileTest, AddSubbmpFailuresLeaveTheHeaderAsStated) {
     tstest::ForEachFileFailure(FileCall::Write, [&](int64_t n) {
         HVT_FileHeader h = start;
         uint8_t index = 99;
-        const int32_t s = HVT_AddSubbmp(fd_, &h, 20, 20, nullptr, &index);
+        HVT_SubbmpHdr hdr{-1, -1, -1, -1};
+        const int32_t s = HVT_AddSubbmp(fd_, &h, 20, 20, &hdr, &index);
         if (!tessarine::testing::FileFailureHit(FileCall::Write)) return;
         EXPECT_EQ(s, -50);
         EXPECT_EQ(index, 1) << "the number is stored first";
-        // writes 1 and 2 (sub-bitmap header, table) come before the count goes up
+        EXPECT_EQ(hdr.width, -1) << "the header out place only on success";
+        // writes 1 and 2 (sub-bitmap header, table) come before the count goes up;
+        // after a failed '.' or header write the memory is one sub-bitmap ahead
         EXPECT_EQ(h.subbmpCount, n <= 2 ? 1 : 2) << n;
+        EXPECT_EQ(h.subbmpOffset[2], n <= 2 ? 0 : 10116 + 16 + 20 + 400) << n;
+    });
+    tstest::ForEachFileFailure(FileCall::Seek, [&](int64_t n) {
+        HVT_FileHeader h = start;
+        const int32_t s = HVT_AddSubbmp(fd_, &h, 20, 20, nullptr, nullptr);
+        if (!tessarine::testing::FileFailureHit(FileCall::Seek)) return;
+        EXPECT_EQ(s, -50);
+        // seeks: sub-bitmap header, '.', file header
+        EXPECT_EQ(h.subbmpCount, n <= 1 ? 1 : 2) << n;
     });
     tstest::ForEachAllocationFailure([&](int64_t) {
         HVT_FileHeader h = start;
@@ -375,6 +408,29 @@ TEST_F(TileOpenTest, UsesTheOwnersDescriptorAndLeavesItOpen) {
     HVT_TileFileEnd(&info, 0);
     EXPECT_EQ(info.descriptor, fd_);
     EXPECT_EQ(FM_Seek(fd_, 0, 0), TS_OK) << "still open";
+}
+
+TEST_F(TileOpenTest, EndReleasesTheSessionBuffers) {
+    ASSERT_EQ(Create(8, 10, 10), TS_OK);
+    HVT_FileInfo info;
+    HVT_InitFileInfo(&info);
+    BI_Bitmap view = View(fd_);
+    ASSERT_EQ(HVT_TileFileBegin(&view, &info, 0), TS_OK);
+    ASSERT_EQ(HVT_GetSubbmpTileHdrs(0, &info), TS_OK);
+    info.readHandle = MEM_AllocHdl(0, 64);
+    info.writeHandle = MEM_AllocHdl(0, 32);
+    ASSERT_NE(info.readHandle, nullptr);
+    ASSERT_NE(info.writeHandle, nullptr);
+    info.readBuffer = static_cast<uint8_t *>(MEM_Lock(info.readHandle));
+    info.writeBuffer = static_cast<uint8_t *>(MEM_Lock(info.writeHandle));
+    HVT_TileFileEnd(&info, 0);  // locked handles are unlocked and freed: the Sandbox sees no leak
+    EXPECT_EQ(info.readHandle, nullptr);
+    EXPECT_EQ(info.writeHandle, nullptr);
+    EXPECT_EQ(info.readBuffer, nullptr);
+    EXPECT_EQ(info.writeBuffer, nullptr);
+    EXPECT_EQ(info.subbmps[0].tileHdrs, nullptr);
+    EXPECT_EQ(info.tileBuffer, nullptr);
+    EXPECT_EQ(info.descriptor, fd_);
 }
 
 TEST_F(TileOpenTest, CorruptedStampOpensWithoutComplaint) {
@@ -550,6 +606,39 @@ TEST_F(TileOpenTest, TileTableThatCannotFitTheFileIsRefused) {
     HVT_TileFileEnd(&info, 0);
 }
 
+// Counts that fit a large (sparse) file but not one read are refused before
+// anything is allocated for them, so no shorter block stands for them.
+TEST_F(TileOpenTest, TablesPastOneReadAreRefusedOnALargeFile) {
+    ASSERT_EQ(Create(8, 10, 10), TS_OK);
+    ASSERT_EQ(::ftruncate(fd_, int64_t{6} << 30), 0);
+    const int32_t manyTiles[2] = {0x10000, 0x1000};  // 2^28 tiles: 5 GiB of table
+    Poke(80 + 8, manyTiles, 8);
+    HVT_FileInfo info;
+    HVT_InitFileInfo(&info);
+    BI_Bitmap view = View(fd_);
+    ASSERT_EQ(HVT_TileFileBegin(&view, &info, 0), TS_OK);
+    tessarine::testing::ResetInjection();
+    EXPECT_EQ(HVT_GetSubbmpTileHdrs(0, &info), -50);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 0);
+    EXPECT_EQ(info.subbmps[0].tileHdrs, nullptr);
+    const HVT_Box box{0, 0, 10, 10};
+    uint8_t buf[200];
+    EXPECT_EQ(HVT_ReadBlock(0, &info, &box, 20, buf), -50);
+    HVT_TileFileEnd(&info, 0);
+
+    // 0x50000000 CMYK entries: 5 GiB of colour table.
+    const uint8_t cmyk = 2;
+    const int32_t colors = 0x50000000;
+    Poke(28, &cmyk, 1);
+    Poke(32, &colors, 4);
+    HVT_InitFileInfo(&info);
+    tessarine::testing::ResetInjection();
+    EXPECT_EQ(HVT_TileFileBegin(&view, &info, 0), -50);
+    EXPECT_EQ(tessarine::testing::AllocationCount(), 1) << "the header only";
+    EXPECT_EQ(info.header, nullptr);
+    EXPECT_EQ(info.colorTable, nullptr);
+}
+
 TEST_F(TileOpenTest, HostileTileRecordsAreRefusedWhenUsed) {
     ASSERT_EQ(Create(8, 10, 10), TS_OK);
     const int32_t wide[5] = {116, -100000, 0, 2000000000, 10};
@@ -581,6 +670,21 @@ TEST_F(TileFileTest, TileRowsAreWrittenAndReadWhole) {
     ASSERT_EQ(HVT_SaveTile(0, f.Info(), 1, 17, 2, small), TS_OK);  // 5 pixels: 1 byte
     EXPECT_EQ(FileBytes(f.Path())[first + 1024 * 20 + 18], 0xCD);
     EXPECT_EQ(HVT_ReadTile(0, f.Info(), 2, 0, 1, back), -4) << "outside the table";
+    // A table not yet loaded is loaded first; without memory that is -5.
+    HVT_FileInfo *info = f.Info();
+    auto drop = [&] {
+        MEM_FreeHdl(info->subbmps[0].tileHdrs);
+        info->subbmps[0].tileHdrs = nullptr;
+    };
+    drop();
+    for (int write = 0; write < 2; ++write) {
+        tstest::ForEachAllocationFailure([&](int64_t) {
+            const int32_t s = write ? HVT_SaveTile(0, info, 0, 0, 2, rows)
+                                    : HVT_ReadTile(0, info, 0, 0, 2, back);
+            EXPECT_EQ(s, tessarine::testing::AllocationFailureHit() ? -5 : TS_OK);
+            drop();
+        });
+    }
     for (FileCall kind : {FileCall::Read, FileCall::Seek}) {
         tstest::ForEachFileFailure(kind, [&](int64_t) {
             const int32_t s = HVT_ReadTile(0, f.Info(), 0, 0, 2, back);

@@ -306,6 +306,10 @@ TEST_F(TileTransfer, OnePixelAt32BitsMovesFourBytesAndRewritesOneTileRow) {
     TileFile f(32, 100, 10);
     ASSERT_EQ(f.Status(), TS_OK);
     ASSERT_EQ(HVT_GetSubbmpTileHdrs(0, f.Info()), TS_OK);
+    std::vector<uint8_t> image(400 * 10);
+    for (size_t i = 0; i < image.size(); ++i) image[i] = static_cast<uint8_t>(i * 7 + 1);
+    const HVT_Box all{0, 0, 100, 10};
+    ASSERT_EQ(HVT_SaveBlock(0, f.Info(), &all, 400, image.data()), TS_OK);
     const HVT_Box b{7, 3, 8, 4};
     const uint8_t px[4] = {1, 2, 3, 4};
     tessarine::testing::ResetInjection();
@@ -314,6 +318,9 @@ TEST_F(TileTransfer, OnePixelAt32BitsMovesFourBytesAndRewritesOneTileRow) {
     EXPECT_EQ(tessarine::testing::FileCallCount(FileCall::Write), 1);
     const auto bytes = tiletest::FileBytes(f.Path());
     EXPECT_EQ(std::memcmp(&bytes[116 + 400 * 3 + 28], px, 4), 0);
+    // The rest of the tile row was read and written back as it was.
+    std::memcpy(&image[400 * 3 + 28], px, 4);
+    EXPECT_EQ(std::memcmp(&bytes[116], image.data(), image.size()), 0);
     uint8_t back[8] = {9, 9, 9, 9, 9, 9, 9, 9};
     ASSERT_EQ(HVT_ReadBlock(0, f.Info(), &b, 0, back), TS_OK);
     EXPECT_EQ(std::memcmp(back, px, 4), 0);
