@@ -6,10 +6,7 @@
 #include <array>
 #include <utility>
 
-#if defined(__x86_64__) || defined(__i386__)
-#include <immintrin.h>
-#define TESSARINE_SHUFFLE_PATH 1
-#endif
+#include "bitmap/cpu_features.h"
 
 namespace tessarine::bitmap {
 namespace {
@@ -166,36 +163,34 @@ __attribute__((target("ssse3"))) void JoinCmykShuffled(const uint8_t *const p[4]
     JoinCmykPlain(rest, n - i, d);
 }
 
-const bool kHasShuffle = __builtin_cpu_supports("ssse3");
-
 #endif
 
 }  // namespace
 
 void SplitRgb(const uint8_t *pixels, int64_t count, uint8_t *r, uint8_t *g, uint8_t *b) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (kHasShuffle) return SplitShuffled(pixels, count, r, g, b);
+    if (HasByteShuffle()) return SplitShuffled(pixels, count, r, g, b);
 #endif
     SplitPlain(pixels, count, r, g, b);
 }
 
 void JoinRgb(const uint8_t *r, const uint8_t *g, const uint8_t *b, int64_t count, uint8_t *pixels) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (kHasShuffle) return JoinShuffled(r, g, b, count, pixels);
+    if (HasByteShuffle()) return JoinShuffled(r, g, b, count, pixels);
 #endif
     JoinPlain(r, g, b, count, pixels);
 }
 
 void SplitCmyk(const uint8_t *pixels, int64_t count, uint8_t *const planes[4]) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (kHasShuffle) return SplitCmykShuffled(pixels, count, planes);
+    if (HasByteShuffle()) return SplitCmykShuffled(pixels, count, planes);
 #endif
     SplitCmykPlain(pixels, count, planes);
 }
 
 void JoinCmyk(const uint8_t *const planes[4], int64_t count, uint8_t *pixels) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (kHasShuffle) return JoinCmykShuffled(planes, count, pixels);
+    if (HasByteShuffle()) return JoinCmykShuffled(planes, count, pixels);
 #endif
     JoinCmykPlain(planes, count, pixels);
 }

@@ -2,10 +2,7 @@
 // where the processor has byte shuffles.
 #include "bitmap/row_pack.h"
 
-#if defined(__x86_64__) || defined(__i386__)
-#include <immintrin.h>
-#define TESSARINE_SHUFFLE_PATH 1
-#endif
+#include "bitmap/cpu_features.h"
 
 namespace tessarine::bitmap {
 namespace {
@@ -50,22 +47,20 @@ __attribute__((target("ssse3"))) void UnpackShuffled(const uint8_t *src, int64_t
     if (i < bytes) Store64(out, kBitFlags[src[i]]);
 }
 
-const bool kHasShuffle = __builtin_cpu_supports("ssse3");
-
 #endif
 
 }  // namespace
 
 void UnpackFlagBytes(const uint8_t *src, int64_t bytes, uint8_t *out) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (kHasShuffle) return UnpackShuffled(src, bytes, out);
+    if (HasByteShuffle()) return UnpackShuffled(src, bytes, out);
 #endif
     for (int64_t i = 0; i < bytes; ++i, out += 8) Store64(out, kBitFlags[src[i]]);
 }
 
 void PackFlagBytes(const uint8_t *values, int64_t bytes, uint8_t *dst, bool highBit) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (kHasShuffle) return PackShuffled(values, bytes, dst, highBit);
+    if (HasByteShuffle()) return PackShuffled(values, bytes, dst, highBit);
 #endif
     if (highBit)
         PackPlain<HighBit>(values, bytes, dst);

@@ -1,0 +1,23 @@
+// Which vector paths this processor can take; asked once.
+#pragma once
+
+#if defined(__x86_64__) || defined(__i386__)
+#include <immintrin.h>
+#define TESSARINE_SHUFFLE_PATH 1
+#endif
+
+namespace tessarine::bitmap {
+
+#ifdef TESSARINE_SHUFFLE_PATH
+// Byte shuffles (SSSE3). The probe runs at first call, after the processor
+// model is known, rather than in a static initialiser that may run first.
+inline bool HasByteShuffle() {
+    static const bool has = [] {
+        __builtin_cpu_init();
+        return __builtin_cpu_supports("ssse3") != 0;
+    }();
+    return has;
+}
+#endif
+
+}  // namespace tessarine::bitmap
