@@ -37,7 +37,7 @@ int32_t NextAddr(FM_BlockFile *file, uint32_t block, uint32_t offset, uint32_t d
         result->block = header.next;
         if (observer != nullptr) {
             status = observer(context, result->block, result->offset);
-            if (Failed(status)) return status;
+            if (status != kOk) return status;
         }
     }
     if (result->block == file->header.endBlock && result->offset >= file->header.endOffset)
