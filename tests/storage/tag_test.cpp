@@ -282,6 +282,30 @@ TEST_F(TagTest, InsertAtOffsetZeroPutsABlockInFrontWhichTheChainStartMisses) {
     EXPECT_EQ(after, (FM_BlockAddr{1, 0}));
 }
 
+TEST_F(TagTest, InsertAtOffsetZeroLinksFurtherBlocksBehindTheBlockInFront) {
+    FM_BlockAddr a = Append(1, 30);
+    FM_TagHdr h = Tag(9, 2 * P);
+    FM_BlockAddr at{}, data{}, next{};
+    ASSERT_EQ(StatusOf(FM_TagInsertHdrAt(file_, a.block, a.offset, &h, &at, &data, &next)), 10);
+    EXPECT_EQ(at, (FM_BlockAddr{2, 0}));
+    EXPECT_EQ(data, (FM_BlockAddr{2, 8}));
+    EXPECT_EQ(next, (FM_BlockAddr{1, 0}));
+    EXPECT_EQ(h.length, 2 * P);
+    EXPECT_TRUE(g_moves.empty());
+    EXPECT_EQ(Hdr(2).next, 3u);  // the block in front, then the one behind it
+    EXPECT_EQ(Hdr(2).prev, 0u);
+    EXPECT_EQ(Hdr(3).next, 1u);
+    EXPECT_EQ(Hdr(3).prev, 2u);
+    EXPECT_EQ(Hdr(1).prev, 3u);
+    EXPECT_EQ(Hdr(2).firstTag, 0u);
+    EXPECT_EQ(Hdr(3).firstTag, 0u);  // the offset of the following tag
+    EXPECT_EQ(file_->header.firstBlock, 1u);
+    EXPECT_EQ(End(), (FM_BlockAddr{1, 30}));
+    FM_BlockAddr after{};
+    EXPECT_EQ(Read(at, &after).kind, 9);
+    EXPECT_EQ(after, (FM_BlockAddr{1, 0}));
+}
+
 TEST_F(TagTest, InsertShortageThatIsNoWholeBlockIsRefusedUnchanged) {
     Append(1, 30);
     FM_BlockAddr b = Append(2, 30);
