@@ -333,6 +333,25 @@ TEST_F(TagTest, InsertThatMustMoveTagsWithoutCallbackFailsAfterCopying) {
     EXPECT_EQ(moved[0], 2);
 }
 
+TEST_F(TagTest, InsertFailingInTheBlockLayerLeavesTheChainLonger) {
+    Append(1, 30);
+    FM_BlockAddr b = Append(2, 30);
+    file_->cacheLimit = 3;  // the third new block finds no node
+    FM_TagHdr h = Tag(9, 3 * P);
+    FM_BlockAddr at{7, 7}, data{7, 7}, next{7, 7};
+    EXPECT_EQ(StatusOf(FM_TagInsertHdrAt(file_, b.block, b.offset, &h, &at, &data, &next)), -5);
+    EXPECT_EQ(at, (FM_BlockAddr{7, 7}));
+    EXPECT_EQ(data, (FM_BlockAddr{7, 7}));
+    EXPECT_EQ(next, (FM_BlockAddr{7, 7}));
+    EXPECT_EQ(file_->header.nextIndex, 4u);
+    EXPECT_EQ(Hdr(1).next, 2u);
+    EXPECT_EQ(Hdr(2).next, 3u);
+    EXPECT_EQ(Hdr(3).next, 1u);
+    EXPECT_TRUE(g_moves.empty());
+    EXPECT_EQ(End(), (FM_BlockAddr{1, 60}));
+    EXPECT_EQ(Walk(), (Tags{{1, 30}, {2, 30}}));
+}
+
 TEST_F(TagTest, NegativeCallbackStopsTheMove) {
     Append(1, 30);
     FM_BlockAddr b = Append(2, 30);
