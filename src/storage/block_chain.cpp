@@ -37,7 +37,7 @@ int32_t NextAddr(FM_BlockFile *file, uint32_t block, uint32_t offset, uint32_t d
         result->block = header.next;
         if (observer != nullptr) {
             status = observer(context, result->block, result->offset);
-            if (Failed(status)) return status;
+            if (status != kOk) return status;
         }
     }
     if (result->block == file->header.endBlock && result->offset >= file->header.endOffset)
@@ -144,7 +144,13 @@ TESSARINE_API int32_t FM_FreeBlock(FM_BlockFile *file, uint32_t index) {
         int32_t status = PatchLink(file, old.next, kPrevField, old.prev);
         if (Failed(status)) return status;
     }
-    int32_t status = PatchLink(file, index, kNextField, h.freeHead);
+    // The free link goes to the file even if a stale image of the block is
+    // still cached under the same index.
+    int32_t offset = 0;
+    int32_t status = SlotOffset(file, index, kNextField, &offset);
+    uint8_t link[4];
+    Store32(link, h.freeHead);
+    if (!Failed(status)) status = FM_SeekAndWrite(file->descriptor, offset, 0, link, 4);
     if (Failed(status)) return status;
     h.freeHead = index;
     return kOk;

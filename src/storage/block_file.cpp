@@ -46,8 +46,9 @@ using namespace tessarine::storage;
 
 constexpr uint8_t kMagic[4] = {FM_BLOCKFILE_MAGIC0, FM_BLOCKFILE_MAGIC1, FM_BLOCKFILE_MAGIC2,
                                FM_BLOCKFILE_MAGIC3};
-// Block 1 must lie within a signed 32-bit offset, so a stride is at most 2^30.
-constexpr uint32_t kMaxStride = 1u << 30;
+// Block 1 must start within a signed 32-bit offset; slots beyond what such an
+// offset reaches are refused when they are taken or moved.
+constexpr uint32_t kMaxStride = INT32_MAX;
 
 bool PathFits(const char *path) {
     return path != nullptr && std::strlen(path) < FM_BLOCKFILE_PATH_BYTES;
@@ -92,7 +93,10 @@ extern "C" {
 TESSARINE_API int32_t FM_BlockFileCreate(const char *path, FM_BlockFile **out, uint32_t payloadSize,
                                          uint8_t cacheLimit, FM_TagCallback tagCallback) {
     if (!PathFits(path)) return kErrArgument;
-    if (payloadSize == 0 || payloadSize > kMaxStride - FM_BLOCK_HDR_BYTES) return kErrArgument;
+    // A payload of 0 would make every walk stand still.
+    if (payloadSize == 0) return kErrArgument;
+    // The write position after the header could not be reached.
+    if (payloadSize > kMaxStride - FM_BLOCK_HDR_BYTES) return kErrFileAccess;
     FM_BlockFile *file = AllocRecord();
     if (file == nullptr) return kErrMemory;
     const uint32_t stride = payloadSize + FM_BLOCK_HDR_BYTES;

@@ -92,7 +92,9 @@ class ScratchBlock {
 int32_t FM_GetFreeMemBlock(FM_BlockFile *file, FM_MemBlock **node);
 
 // FM_GetNextAddr with an observer of every block stepped into; the observer
-// returns a status and a failure stops the step.
+// returns a status: a failure stops the step with it, kStopWalk stops it with
+// the result half-way and is handed back as it is.
+inline constexpr int32_t kStopWalk = 1;
 using BlockObserver = int32_t (*)(void *context, uint32_t block, uint32_t offsetLeft);
 int32_t NextAddr(FM_BlockFile *file, uint32_t block, uint32_t offset, uint32_t distance,
                  FM_BlockAddr *result, BlockObserver observer, void *context);

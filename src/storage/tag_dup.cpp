@@ -19,7 +19,7 @@ constexpr uint8_t kDupCacheLimit = 5;
 struct Passed {
     uint8_t *bits = nullptr;
     uint64_t count = 0;
-    bool revisit = false;  // the last step landed at offset 0 of a passed block
+    bool revisit = false;  // the last tag steps into a passed block
 
     Passed() = default;
     Passed(const Passed &) = delete;
@@ -36,14 +36,14 @@ struct Passed {
     bool Seen(uint32_t block) const { return (bits[block / 8] >> (block % 8)) & 1; }
     void Mark(uint32_t block) { bits[block / 8] |= uint8_t(1u << (block % 8)); }
 
-    static int32_t Step(void *context, uint32_t block, uint32_t offsetLeft) {
+    static int32_t Step(void *context, uint32_t block, uint32_t) {
         auto *self = static_cast<Passed *>(context);
-        if (block == 0 || block >= self->count) return kErrFileAccess;
-        if (self->revisit) return kErrFileAccess;  // the tag runs on into passed blocks
+        // A next of 0 ends the chain: no tag follows.
+        if (block == 0) return kOk;
+        if (block >= self->count) return kErrFileAccess;
         if (self->Seen(block)) {
-            if (offsetLeft != 0) return kErrFileAccess;
             self->revisit = true;
-            return kOk;
+            return kStopWalk;
         }
         self->Mark(block);
         return kOk;
@@ -91,7 +91,8 @@ int32_t CopyLiveTags(FM_BlockFile *source, FM_BlockFile *destination, uint8_t *b
         status = NextAddr(source, at.block, at.offset, header.length, &next, Passed::Step, &passed);
         if (Failed(status)) return status;
         if (passed.revisit) {
-            // Only a stream that fills its last block ends this way.
+            // Only a stream that fills its last block ends this way; with an
+            // end position the chain runs in a circle that misses it.
             if (h.endBlock != 0) return kErrFileAccess;
             next.block = 0;
         }

@@ -138,6 +138,31 @@ TEST_F(BlockChainTest, FreeListIsLastInFirstOut) {
     EXPECT_EQ(file_->header.freeHead, 0u);
 }
 
+TEST_F(BlockChainTest, FreeLinkIsWrittenToTheFileNotToAStaleCachedImage) {
+    Make(8);
+    Add(0);
+    Add(1);
+    Reopen(8);
+    ASSERT_EQ(StatusOf(FM_FreeBlock(file_, 2)), 10);
+    ASSERT_EQ(StatusOf(FM_FreeBlock(file_, 1)), 10);  // free list 1 -> 2
+    // A fetch of the free block caches its image; the new block taken from
+    // the free list then gets a second node under the same index.
+    FM_MemBlock *stale = nullptr;
+    ASSERT_EQ(StatusOf(FM_GetMemBlockByIndex(file_, 1, &stale)), 10);
+    ASSERT_EQ(ImageWord(stale, 0), 2u);
+    stale->image[0] = 0x77;
+    FM_MemBlock *fresh = nullptr;
+    ASSERT_EQ(StatusOf(FM_NewBlock(file_, &fresh)), 10);
+    ASSERT_EQ(fresh->index, 1u);
+    ASSERT_NE(fresh, stale);
+    EXPECT_EQ(file_->header.freeHead, 2u);
+    EXPECT_EQ(StatusOf(FM_FreeBlock(file_, 1)), 10);  // releases the newer node
+    EXPECT_EQ(file_->header.freeHead, 1u);
+    EXPECT_EQ(CacheIndexes(file_), (std::vector<uint32_t>{1}));
+    EXPECT_EQ(stale->image[0], 0x77);
+    EXPECT_EQ(Le32(ReadAll(path_), 36), 2u);
+}
+
 TEST_F(BlockChainTest, FreeingUnlinksAndMovesFirstAndLast) {
     Make(8);
     Add(0);

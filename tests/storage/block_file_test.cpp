@@ -182,9 +182,30 @@ TEST_F(BlockFileTest, PathTooLongForTheRecordIsRefused) {
 TEST_F(BlockFileTest, CreateRefusesPayloadThatCannotWalk) {
     FM_BlockFile *file = nullptr;
     EXPECT_EQ(StatusOf(FM_BlockFileCreate(Path("z.blk").c_str(), &file, 0, 4, nullptr)), -4);
-    EXPECT_EQ(StatusOf(FM_BlockFileCreate(Path("z.blk").c_str(), &file, 0xFFFFFFFFu, 4, nullptr)),
-              -4);
+    for (uint32_t payload : {0x7FFFFFF4u, 0xFFFFFFF4u, 0xFFFFFFFFu})
+        EXPECT_EQ(StatusOf(FM_BlockFileCreate(Path("z.blk").c_str(), &file, payload, 4, nullptr)),
+                  -50)
+            << payload;
     EXPECT_EQ(file, nullptr);
+}
+
+TEST_F(BlockFileTest, CreateTakesAnyPayloadWhoseFirstBlockStartsWithinAnOffset) {
+    const std::string path = Path("big.blk");
+    for (uint32_t payload : {0x40000000u, 0x7FFFFFF3u}) {
+        FM_BlockFile *file = nullptr;
+        ASSERT_EQ(StatusOf(FM_BlockFileCreate(path.c_str(), &file, payload, 4, nullptr)), 10);
+        EXPECT_EQ(file->header.stride, payload + 12);
+        EXPECT_EQ(file->nodeBytes, offsetof(FM_MemBlock, image) + payload + 12);
+        int32_t position = 0;
+        ASSERT_EQ(StatusOf(FM_Tell(file->descriptor, &position)), 10);
+        EXPECT_EQ(uint32_t(position), payload + 12);
+        ASSERT_EQ(StatusOf(FM_BlockFileClose(&file)), 10);
+        EXPECT_EQ(ReadAll(path).size(), 36u);
+        ASSERT_EQ(StatusOf(FM_BlockFileOpen(path.c_str(), &file, 4)), 10);
+        EXPECT_EQ(file->header.payloadSize, payload);
+        ASSERT_EQ(StatusOf(FM_BlockFileClose(&file)), 10);
+        FM_Delete(path.c_str());
+    }
 }
 
 TEST_F(BlockFileTest, CreateFailureDeletesThePathAndLeavesOutUntouched) {

@@ -135,12 +135,49 @@ TEST_F(BlockHostileTest, ChainRunningIntoBlockZeroOrPastTheFile) {
     uint8_t b[60];
     EXPECT_EQ(StatusOf(FM_BlockRead(f, 1, 0, 60, b, nullptr)), -4);
     FM_BlockFileClose(&f);
-    EXPECT_EQ(StatusOf(Dup()), -50);
+    // A next of 0 ends the walk: no tag follows the one that fills block 1.
+    EXPECT_EQ(StatusOf(Dup()), 10);
+    f = nullptr;
+    ASSERT_EQ(StatusOf(FM_BlockFileOpen(Path("copy.blk").c_str(), &f, 5)), 10);
+    EXPECT_EQ(f->header.nextIndex, 2u);
+    FM_TagHdr h{};
+    EXPECT_EQ(StatusOf(FM_TagReadHdr(f, 1, 0, &h, nullptr, nullptr)), 10);
+    EXPECT_EQ(h.kind, 2);
+    EXPECT_EQ(h.length, 40u);
+    FM_BlockFileClose(&f);
     PutLe32(bytes, S, 1000);  // next far past the end of the file
     f = Open(bytes);
     EXPECT_EQ(StatusOf(FM_BlockRead(f, 1, 0, 60, b, nullptr)), -50);
     FM_BlockFileClose(&f);
     EXPECT_EQ(StatusOf(Dup()), -50);
+}
+
+// With the last block full there is no end mark: the copy ends after the tag
+// that would step into a passed block, wherever in that block it lands.
+TEST_F(BlockHostileTest, FullLastBlockWalkEndsOnStepIntoAPassedBlockAtAnyOffset) {
+    for (uint32_t length : {48u, 100u}) {
+        SCOPED_TRACE(length);
+        auto bytes = Header(P, S, 3, 0, 0);
+        PutBlock(bytes, 1, 2, {{1, 40}});
+        PutBlock(bytes, 2, 1, {{2, length}});  // runs on into block 1
+        WriteAll(Path("h.blk"), bytes);
+        EXPECT_EQ(StatusOf(Dup()), 10);
+        FM_BlockFile *f = nullptr;
+        ASSERT_EQ(StatusOf(FM_BlockFileOpen(Path("copy.blk").c_str(), &f, 5)), 10);
+        FM_TagHdr h{};
+        EXPECT_EQ(StatusOf(FM_TagReadHdr(f, 2, 0, &h, nullptr, nullptr)), 10);
+        EXPECT_EQ(h.kind, 2);
+        EXPECT_EQ(h.length, length);
+        EXPECT_EQ(f->header.endBlock, length == 48 ? 3u : 4u);
+        EXPECT_EQ(f->header.endOffset, length % P);
+        FM_BlockFileClose(&f);
+        FM_Delete(Path("copy.blk").c_str());
+        // With an end position that the circle misses, the same walk fails.
+        PutLe32(bytes, 28, 2);
+        PutLe32(bytes, 32, 39);
+        WriteAll(Path("h.blk"), bytes);
+        EXPECT_EQ(StatusOf(Dup()), -50);
+    }
 }
 
 TEST_F(BlockHostileTest, HugeFreeHeadOrNextIndexGivesAStatus) {

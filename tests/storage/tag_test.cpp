@@ -282,6 +282,30 @@ TEST_F(TagTest, InsertAtOffsetZeroPutsABlockInFrontWhichTheChainStartMisses) {
     EXPECT_EQ(after, (FM_BlockAddr{1, 0}));
 }
 
+TEST_F(TagTest, InsertAtOffsetZeroLinksFurtherBlocksBehindTheBlockInFront) {
+    FM_BlockAddr a = Append(1, 30);
+    FM_TagHdr h = Tag(9, 2 * P);
+    FM_BlockAddr at{}, data{}, next{};
+    ASSERT_EQ(StatusOf(FM_TagInsertHdrAt(file_, a.block, a.offset, &h, &at, &data, &next)), 10);
+    EXPECT_EQ(at, (FM_BlockAddr{2, 0}));
+    EXPECT_EQ(data, (FM_BlockAddr{2, 8}));
+    EXPECT_EQ(next, (FM_BlockAddr{1, 0}));
+    EXPECT_EQ(h.length, 2 * P);
+    EXPECT_TRUE(g_moves.empty());
+    EXPECT_EQ(Hdr(2).next, 3u);  // the block in front, then the one behind it
+    EXPECT_EQ(Hdr(2).prev, 0u);
+    EXPECT_EQ(Hdr(3).next, 1u);
+    EXPECT_EQ(Hdr(3).prev, 2u);
+    EXPECT_EQ(Hdr(1).prev, 3u);
+    EXPECT_EQ(Hdr(2).firstTag, 0u);
+    EXPECT_EQ(Hdr(3).firstTag, 0u);  // the offset of the following tag
+    EXPECT_EQ(file_->header.firstBlock, 1u);
+    EXPECT_EQ(End(), (FM_BlockAddr{1, 30}));
+    FM_BlockAddr after{};
+    EXPECT_EQ(Read(at, &after).kind, 9);
+    EXPECT_EQ(after, (FM_BlockAddr{1, 0}));
+}
+
 TEST_F(TagTest, InsertShortageThatIsNoWholeBlockIsRefusedUnchanged) {
     Append(1, 30);
     FM_BlockAddr b = Append(2, 30);
@@ -307,6 +331,25 @@ TEST_F(TagTest, InsertThatMustMoveTagsWithoutCallbackFailsAfterCopying) {
     uint8_t moved[8];
     ASSERT_EQ(StatusOf(FM_BlockRead(file_, 2, 30, 8, moved, nullptr)), 10);
     EXPECT_EQ(moved[0], 2);
+}
+
+TEST_F(TagTest, InsertFailingInTheBlockLayerLeavesTheChainLonger) {
+    Append(1, 30);
+    FM_BlockAddr b = Append(2, 30);
+    file_->cacheLimit = 3;  // the third new block finds no node
+    FM_TagHdr h = Tag(9, 3 * P);
+    FM_BlockAddr at{7, 7}, data{7, 7}, next{7, 7};
+    EXPECT_EQ(StatusOf(FM_TagInsertHdrAt(file_, b.block, b.offset, &h, &at, &data, &next)), -5);
+    EXPECT_EQ(at, (FM_BlockAddr{7, 7}));
+    EXPECT_EQ(data, (FM_BlockAddr{7, 7}));
+    EXPECT_EQ(next, (FM_BlockAddr{7, 7}));
+    EXPECT_EQ(file_->header.nextIndex, 4u);
+    EXPECT_EQ(Hdr(1).next, 2u);
+    EXPECT_EQ(Hdr(2).next, 3u);
+    EXPECT_EQ(Hdr(3).next, 1u);
+    EXPECT_TRUE(g_moves.empty());
+    EXPECT_EQ(End(), (FM_BlockAddr{1, 60}));
+    EXPECT_EQ(Walk(), (Tags{{1, 30}, {2, 30}}));
 }
 
 TEST_F(TagTest, NegativeCallbackStopsTheMove) {
