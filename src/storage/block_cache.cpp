@@ -36,7 +36,7 @@ int32_t ReadLink(FM_BlockFile *file, uint32_t index, uint32_t field, uint32_t *v
     uint8_t bytes[4];
     if (!Failed(status)) status = FM_SeekAndRead(file->descriptor, offset, 0, bytes, 4);
     if (Failed(status)) return status;
-    *value = Load32(bytes);
+    *value = GetU32(bytes);
     return kOk;
 }
 
@@ -49,7 +49,7 @@ int32_t PatchLink(FM_BlockFile *file, uint32_t index, uint32_t field, uint32_t v
     int32_t status = SlotOffset(file, index, field, &offset);
     if (Failed(status)) return status;
     uint8_t bytes[4];
-    Store32(bytes, value);
+    PutU32(bytes, value);
     return FM_SeekAndWrite(file->descriptor, offset, 0, bytes, 4);
 }
 
@@ -138,9 +138,9 @@ TESSARINE_API int32_t FM_GetFileBlockHdrByIndex(FM_BlockFile *file, uint32_t ind
             status = FM_SeekAndRead(file->descriptor, offset, 0, bytes, sizeof bytes);
         if (Failed(status)) return status;
     }
-    header->next = Load32(bytes + kNextField);
-    header->prev = Load32(bytes + kPrevField);
-    header->firstTag = Load32(bytes + kFirstTagField);
+    header->next = GetU32(bytes + kNextField);
+    header->prev = GetU32(bytes + kPrevField);
+    header->firstTag = GetU32(bytes + kFirstTagField);
     return kOk;
 }
 

@@ -67,7 +67,7 @@ TESSARINE_API int32_t FM_NewBlock(FM_BlockFile *file, FM_MemBlock **out) {
         status = SlotOffset(file, h.freeHead, kNextField, &offset);
         if (!Failed(status)) status = FM_SeekAndRead(file->descriptor, offset, 0, bytes, 4);
         if (Failed(status)) return status;
-        h.freeHead = Load32(bytes);
+        h.freeHead = GetU32(bytes);
     } else {
         index = h.nextIndex;
         ++h.nextIndex;
@@ -149,7 +149,7 @@ TESSARINE_API int32_t FM_FreeBlock(FM_BlockFile *file, uint32_t index) {
     int32_t offset = 0;
     int32_t status = SlotOffset(file, index, kNextField, &offset);
     uint8_t link[4];
-    Store32(link, h.freeHead);
+    PutU32(link, h.freeHead);
     if (!Failed(status)) status = FM_SeekAndWrite(file->descriptor, offset, 0, link, 4);
     if (Failed(status)) return status;
     h.freeHead = index;

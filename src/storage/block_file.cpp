@@ -15,26 +15,26 @@ void EncodeFileHdr(const FM_BlockFileHdr &h, uint8_t out[FM_BLOCKFILE_HDR_BYTES]
     std::memcpy(out, h.magic, 4);
     const uint32_t words[] = {h.payloadSize, h.stride,   h.nextIndex, h.firstBlock,
                               h.lastBlock,   h.freeHead, h.endBlock,  h.endOffset};
-    for (size_t i = 0; i < 8; ++i) Store32(out + 4 + 4 * i, words[i]);
+    for (size_t i = 0; i < 8; ++i) PutU32(out + 4 + 4 * i, words[i]);
 }
 
 void DecodeFileHdr(const uint8_t in[FM_BLOCKFILE_HDR_BYTES], FM_BlockFileHdr *h) {
     std::memcpy(h->magic, in, 4);
     uint32_t *words[] = {&h->payloadSize, &h->stride,   &h->nextIndex, &h->firstBlock,
                          &h->lastBlock,   &h->freeHead, &h->endBlock,  &h->endOffset};
-    for (size_t i = 0; i < 8; ++i) *words[i] = Load32(in + 4 + 4 * i);
+    for (size_t i = 0; i < 8; ++i) *words[i] = GetU32(in + 4 + 4 * i);
 }
 
 void EncodeTagHdr(const FM_TagHdr &h, uint8_t out[FM_TAG_HDR_BYTES]) {
     out[0] = h.kind;
     std::memcpy(out + 1, h.extra, 3);
-    Store32(out + 4, h.length);
+    PutU32(out + 4, h.length);
 }
 
 void DecodeTagHdr(const uint8_t in[FM_TAG_HDR_BYTES], FM_TagHdr *h) {
     h->kind = in[0];
     std::memcpy(h->extra, in + 1, 3);
-    h->length = Load32(in + 4);
+    h->length = GetU32(in + 4);
 }
 
 }  // namespace tessarine::storage

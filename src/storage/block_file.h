@@ -9,6 +9,8 @@
 #include <tessarine/core.h>
 #include <tessarine/storage.h>
 
+#include "storage/little_endian.h"
+
 namespace tessarine::storage {
 
 static_assert(sizeof(FM_BlockFileHdr) == 36, "block file header is 36 bytes on disk");
@@ -23,16 +25,6 @@ inline constexpr uint32_t kNextField = 0;  // slot offsets of the link words
 inline constexpr uint32_t kPrevField = 4;
 inline constexpr uint32_t kFirstTagField = 8;
 
-inline uint32_t Load32(const uint8_t *p) {
-    return uint32_t(p[0]) | uint32_t(p[1]) << 8 | uint32_t(p[2]) << 16 | uint32_t(p[3]) << 24;
-}
-inline void Store32(uint8_t *p, uint32_t v) {
-    p[0] = uint8_t(v);
-    p[1] = uint8_t(v >> 8);
-    p[2] = uint8_t(v >> 16);
-    p[3] = uint8_t(v >> 24);
-}
-
 inline ListNode *AsList(FM_MemBlock *node) {
     return reinterpret_cast<ListNode *>(node);
 }
@@ -44,10 +36,10 @@ inline uint8_t *NodeData(FM_MemBlock *node) {
     return node->image + FM_BLOCK_HDR_BYTES;
 }
 inline uint32_t NodeWord(const FM_MemBlock *node, uint32_t field) {
-    return Load32(node->image + field);
+    return GetU32(node->image + field);
 }
 inline void SetNodeWord(FM_MemBlock *node, uint32_t field, uint32_t value) {
-    Store32(node->image + field, value);
+    PutU32(node->image + field, value);
 }
 
 void EncodeFileHdr(const FM_BlockFileHdr &header, uint8_t out[FM_BLOCKFILE_HDR_BYTES]);

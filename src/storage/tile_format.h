@@ -9,6 +9,8 @@
 
 #include <tessarine/storage.h>
 
+#include "storage/little_endian.h"
+
 namespace tessarine::storage {
 
 inline constexpr int32_t kFileHeaderBytes = 80;
@@ -30,26 +32,6 @@ static_assert(offsetof(HVT_FileHeader, subbmpCount) == 37);
 static_assert(offsetof(HVT_FileHeader, subbmpOffset) == 40);
 static_assert(sizeof(HVT_SubbmpHdr) == 16);
 static_assert(sizeof(HVT_TileHdr) == 20);
-
-inline void PutU32(uint8_t *at, uint32_t v) {
-    at[0] = static_cast<uint8_t>(v);
-    at[1] = static_cast<uint8_t>(v >> 8);
-    at[2] = static_cast<uint8_t>(v >> 16);
-    at[3] = static_cast<uint8_t>(v >> 24);
-}
-inline uint32_t GetU32(const uint8_t *at) {
-    return uint32_t{at[0]} | uint32_t{at[1]} << 8 | uint32_t{at[2]} << 16 | uint32_t{at[3]} << 24;
-}
-inline void PutI32(uint8_t *at, int32_t v) { PutU32(at, static_cast<uint32_t>(v)); }
-inline int32_t GetI32(const uint8_t *at) { return static_cast<int32_t>(GetU32(at)); }
-inline void PutF64(uint8_t *at, double v) {
-    const auto bits = std::bit_cast<uint64_t>(v);
-    PutU32(at, static_cast<uint32_t>(bits));
-    PutU32(at + 4, static_cast<uint32_t>(bits >> 32));
-}
-inline double GetF64(const uint8_t *at) {
-    return std::bit_cast<double>(uint64_t{GetU32(at)} | uint64_t{GetU32(at + 4)} << 32);
-}
 
 void EncodeFileHeader(const HVT_FileHeader &header, uint8_t out[kFileHeaderBytes]);
 void DecodeFileHeader(const uint8_t in[kFileHeaderBytes], HVT_FileHeader &header);
