@@ -162,7 +162,6 @@ alignas(32) constexpr double kFirst[4] = {0.03241, 0.01876, 0.000556, 0};
 alignas(32) constexpr double kSecond[4] = {-0.015374, 0.000416, -0.00204, 0};
 alignas(32) constexpr double kThird[4] = {-0.004986, -0.009692, 0.01057, 0};
 alignas(32) constexpr double kIndexScale[4] = {255.9, 255.9, 255.9, 255.9};
-alignas(16) constexpr int32_t kLastIndex[4] = {255, 255, 255, 255};
 
 TESSARINE_AVX2 inline __m256d Load(const double *v) {
     return _mm256_load_pd(v);
@@ -240,7 +239,7 @@ TESSARINE_AVX2 inline __m256d ProductOf(const Lanes &a, const Lanes &b) {
 
 }  // namespace
 
-TESSARINE_AVX2 void SwopCmykToSRgbAvx2(const uint8_t *cmyk, uint8_t *rgb) {
+TESSARINE_AVX2 void SwopCmykToSRgbAvx2(const uint8_t *cmyk, uint8_t *rgb, const GammaTable &gamma) {
     const uint8_t c = cmyk[0], m = cmyk[1], y = cmyk[2], kByte = cmyk[3];
     const InkFactors &cf = kInk.byValue[c];
     const InkFactors &mf = kInk.byValue[m];
@@ -286,7 +285,10 @@ TESSARINE_AVX2 void SwopCmykToSRgbAvx2(const uint8_t *cmyk, uint8_t *rgb) {
     __m256d v = _mm256_add_pd(
         _mm256_add_pd(_mm256_mul_pd(first, Load(kFirst)), _mm256_mul_pd(second, Load(kSecond))),
         _mm256_mul_pd(third, Load(kThird)));
-    if (_mm256_movemask_pd(_mm256_cmp_pd(v, _mm256_setzero_pd(), _CMP_LT_OQ)) != 0) {
+    // A set sign bit: some value is below 0, or is -0. For -0 alone the
+    // smallest value is a zero, t is a zero and the step changes nothing but
+    // the sign of a zero, which the index does not see.
+    if (_mm256_movemask_pd(v) != 0) {
         // Lane 3 is 0, so the smallest lane is the smallest of R, G, B.
         __m256d low = _mm256_min_pd(v, _mm256_permute4x64_pd(v, 0x4E));
         low = _mm256_min_pd(low, _mm256_permute_pd(low, 0x5));
@@ -296,17 +298,14 @@ TESSARINE_AVX2 void SwopCmykToSRgbAvx2(const uint8_t *cmyk, uint8_t *rgb) {
     }
     // Truncating v 255.9 and clamping the index to 0..255 gives the index of
     // the clamped value: the products agree inside [0, 1], a value at or below
-    // 0 truncates to 0 or less, and one above 1 to 255 or more. |v| stays far
-    // below 2^31 / 255.9.
-    __m128i index = _mm256_cvttpd_epi32(_mm256_mul_pd(v, Load(kIndexScale)));
-    index = _mm_min_epi32(_mm_max_epi32(index, _mm_setzero_si128()),
-                          _mm_load_si128(reinterpret_cast<const __m128i *>(kLastIndex)));
-    alignas(16) int32_t at[4];
-    _mm_store_si128(reinterpret_cast<__m128i *>(at), index);
-    const GammaTable &gamma = CX_CmykGammaTable();
-    rgb[0] = gamma.entry[at[0]];
-    rgb[1] = gamma.entry[at[1]];
-    rgb[2] = gamma.entry[at[2]];
+    // 0 truncates to 0 or less, and one above 1 to 255 or more. The two packs
+    // saturate to 16 bits, signed, and then to 0..255.
+    const __m128i index32 = _mm256_cvttpd_epi32(_mm256_mul_pd(v, Load(kIndexScale)));
+    const __m128i index8 = _mm_packus_epi16(_mm_packs_epi32(index32, index32), index32);
+    const uint32_t at = static_cast<uint32_t>(_mm_cvtsi128_si32(index8));
+    rgb[0] = gamma.entry[at & 0xFF];
+    rgb[1] = gamma.entry[(at >> 8) & 0xFF];
+    rgb[2] = gamma.entry[(at >> 16) & 0xFF];
 }
 
 }  // namespace tessarine::color

@@ -4,14 +4,17 @@
 
 #include <cstdint>
 
+#include "color/gamma_tables.h"
+
 namespace tessarine::color {
 
 // The formula term by term, in scalar doubles.
 void SwopCmykToSRgbScalar(const uint8_t *cmyk, uint8_t *rgb);
 
 // The same operations on the same operands, four lanes at a time (AVX2).
-// Call only when HasAvx2() is true.
-void SwopCmykToSRgbAvx2(const uint8_t *cmyk, uint8_t *rgb);
+// Call only when HasAvx2() is true, with CX_CmykGammaTable(): taken by the
+// caller, so that the vector code makes no call.
+void SwopCmykToSRgbAvx2(const uint8_t *cmyk, uint8_t *rgb, const GammaTable &gamma);
 
 bool HasAvx2();
 

@@ -68,9 +68,15 @@ bool HasAvx2() {
 
 }  // namespace tessarine::color
 
+// The first call takes the scalar path, which builds the gamma table; the
+// vector path then finds it built.
 extern "C" TESSARINE_API void CX_SWOPCmyk2SRgb(const uint8_t *cmyk, uint8_t *rgb) {
-    if (tessarine::color::g_avx2)
-        tessarine::color::SwopCmykToSRgbAvx2(cmyk, rgb);
-    else
-        tessarine::color::SwopCmykToSRgbScalar(cmyk, rgb);
+    using namespace tessarine::color;
+    if (g_avx2) {
+        if (const GammaTable *gamma = CmykGammaTableIfBuilt()) {
+            SwopCmykToSRgbAvx2(cmyk, rgb, *gamma);
+            return;
+        }
+    }
+    SwopCmykToSRgbScalar(cmyk, rgb);
 }
