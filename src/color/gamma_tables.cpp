@@ -27,10 +27,13 @@ GammaTable BuildLabGamma() {
 
 }  // namespace
 
+std::atomic<const GammaTable *> g_cmykGammaBuilt{nullptr};
+
 // A function-local static is built once, under the language's own guard; a
 // second thread waits for the first instead of building the same bytes again.
 const GammaTable &CX_CmykGammaTable() {
     static const GammaTable table = BuildCmykGamma();
+    g_cmykGammaBuilt.store(&table, std::memory_order_release);
     return table;
 }
 

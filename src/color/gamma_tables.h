@@ -2,6 +2,7 @@
 // their first use and indexed by the truncation of a value in [0, 1] * 255.9.
 #pragma once
 
+#include <atomic>
 #include <cstdint>
 
 namespace tessarine::color {
@@ -14,5 +15,13 @@ struct GammaTable {
 const GammaTable &CX_CmykGammaTable();
 // The sRGB curve with its break at 0.00304, indexed by i / 256.
 const GammaTable &CX_LabGammaTable();
+
+// The CMYK table's flag: null until the table is complete, then the table.
+// Per-pixel code reads it with one load instead of a call.
+extern __attribute__((visibility("hidden"))) std::atomic<const GammaTable *> g_cmykGammaBuilt;
+
+inline const GammaTable *CmykGammaTableIfBuilt() {
+    return g_cmykGammaBuilt.load(std::memory_order_acquire);
+}
 
 }  // namespace tessarine::color

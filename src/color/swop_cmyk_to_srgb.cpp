@@ -3,12 +3,13 @@
 #include "color/device_tables.h"
 #include "color/gamma_tables.h"
 #include "color/lab_to_rgb.h"
+#include "color/swop_cmyk_paths.h"
 
-using namespace tessarine::color;
+namespace tessarine::color {
 
 // A Neugebauer model in Lab: primaries 0 to 7 at no black, 8 to 15 at half
 // black, and black itself at full black, joined by a quadratic in k.
-extern "C" TESSARINE_API void CX_SWOPCmyk2SRgb(const uint8_t *cmyk, uint8_t *rgb) {
+void SwopCmykToSRgbScalar(const uint8_t *cmyk, uint8_t *rgb) {
     const double c = cmyk[0] * 0.00392156862745098;
     const double m = cmyk[1] * 0.00392156862745098;
     const double y = cmyk[2] * 0.00392156862745098;
@@ -46,4 +47,36 @@ extern "C" TESSARINE_API void CX_SWOPCmyk2SRgb(const uint8_t *cmyk, uint8_t *rgb
     }
     const GammaTable &gamma = CX_CmykGammaTable();
     for (int i = 0; i < 3; ++i) rgb[i] = gamma.entry[static_cast<int>(Clamp01(v[i]) * 255.9)];
+}
+
+namespace {
+
+bool DetectAvx2() {
+    __builtin_cpu_init();
+    return __builtin_cpu_supports("avx2");
+}
+
+// Set while the library loads. A call made before that (from another
+// initialiser) finds false and takes the scalar path: the same bytes.
+const bool g_avx2 = DetectAvx2();
+
+}  // namespace
+
+bool HasAvx2() {
+    return g_avx2;
+}
+
+}  // namespace tessarine::color
+
+// The first call takes the scalar path, which builds the gamma table; the
+// vector path then finds it built.
+extern "C" TESSARINE_API void CX_SWOPCmyk2SRgb(const uint8_t *cmyk, uint8_t *rgb) {
+    using namespace tessarine::color;
+    if (g_avx2) {
+        if (const GammaTable *gamma = CmykGammaTableIfBuilt()) {
+            SwopCmykToSRgbAvx2(cmyk, rgb, *gamma);
+            return;
+        }
+    }
+    SwopCmykToSRgbScalar(cmyk, rgb);
 }

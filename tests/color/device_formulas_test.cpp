@@ -11,6 +11,7 @@
 
 #include "color/device_tables.h"
 #include "color/gamma_tables.h"
+#include "color/swop_cmyk_paths.h"
 
 namespace {
 using namespace tessarine::color;
@@ -342,6 +343,62 @@ TEST(SwopCmykToSRgb, OutOfGamutColourIsDesaturatedNotClipped) {
     EXPECT_NE(got[1], CmykGamma(std::fmin(1.0, std::fmax(0.0, linear[1]))));
 }
 
+// The vector path regroups the work (tabulated factors, rows side by side,
+// zero terms left out) but must give the formula's bytes for every input.
+using CmykFunction = void (*)(const uint8_t *, uint8_t *);
+
+// Compares `function` with the formula over every c, m, y in `values` for each
+// k in `blacks`; stops at the first difference.
+void ExpectFormulaBytes(CmykFunction function, const std::vector<int> &values,
+                        const std::vector<int> &blacks) {
+    int want[3];
+    uint8_t got[3];
+    for (int k : blacks)
+        for (int c : values)
+            for (int m : values)
+                for (int y : values) {
+                    const uint8_t cmyk[4] = {static_cast<uint8_t>(c), static_cast<uint8_t>(m),
+                                             static_cast<uint8_t>(y), static_cast<uint8_t>(k)};
+                    ReferenceSRgbFromCmyk(cmyk, want);
+                    function(cmyk, got);
+                    if (got[0] != want[0] || got[1] != want[1] || got[2] != want[2]) {
+                        ADD_FAILURE() << "c " << c << " m " << m << " y " << y << " k " << k
+                                      << ": " << int{got[0]} << " " << int{got[1]} << " "
+                                      << int{got[2]} << ", formula " << want[0] << " " << want[1]
+                                      << " " << want[2];
+                        return;
+                    }
+                }
+}
+
+std::vector<int> Range(int first, int last, int step) {
+    std::vector<int> values;
+    for (int v = first; v <= last; v += step) values.push_back(v);
+    return values;
+}
+
+TEST(SwopCmykToSRgb, EveryInkAtSeveralBlacksGivesTheFormulaBytes) {
+    // All 2^24 inks without black (no half-black terms) and with black.
+    ExpectFormulaBytes(CX_SWOPCmyk2SRgb, Range(0, 255, 1), {0, 131});
+}
+
+TEST(SwopCmykToSRgb, EveryBlackGivesTheFormulaBytes) {
+    // Every k over inks that include 0 and 255 (the shortened sums) and values
+    // between them.
+    ExpectFormulaBytes(CX_SWOPCmyk2SRgb, Range(0, 255, 15), Range(0, 255, 1));
+    ExpectFormulaBytes(CX_SWOPCmyk2SRgb, {0, 1, 2, 3, 126, 127, 128, 129, 252, 253, 254, 255},
+                       Range(0, 255, 1));
+}
+
+TEST(SwopCmykToSRgb, BothPathsGiveTheFormulaBytes) {
+    // The exported function takes one of them; check each on its own.
+    ExpectFormulaBytes(SwopCmykToSRgbScalar, Range(0, 255, 15), Range(0, 255, 3));
+    if (!HasAvx2()) GTEST_SKIP() << "no AVX2 on this processor";
+    ExpectFormulaBytes([](const uint8_t *cmyk, uint8_t *rgb) {
+        SwopCmykToSRgbAvx2(cmyk, rgb, CX_CmykGammaTable());
+    }, Range(0, 255, 5), {0, 1, 64, 127, 128, 200, 254, 255});
+}
+
 // ---- Lab to sRGB -------------------------------------------------------------------
 
 TEST(LabToSRgb, WhiteStopsAt254) {
@@ -381,7 +438,10 @@ TEST(LabToSRgb, Lightness20IsStraightAnd21Cubic) {
                 if (straight[0] != cubic[0] || straight[1] != cubic[1] || straight[2] != cubic[2])
                     ++(L == 20 ? differing20 : differing21);
             }
-    // The branches meet almost continuously; still some colours tell them apart.
+    // The branches meet almost continuously; still some colours tell them
+    // apart, so the comparisons above do see which branch was taken.
+    EXPECT_GT(differing20, 0);
+    EXPECT_GT(differing21, 0);
     RecordProperty("colours telling the branches apart at 20", differing20);
     RecordProperty("colours telling the branches apart at 21", differing21);
 }
