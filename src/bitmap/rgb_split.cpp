@@ -266,21 +266,29 @@ TESSARINE_PERMUTE_TARGET void SplitPermuted(const uint8_t *s, int64_t n, uint8_t
     }
 }
 
+// The stores start on a 64-byte boundary: the first h pixels go the short
+// way, with 3 * h + (d mod 64) a multiple of 64 (43 is the inverse of 3
+// modulo 64).
 TESSARINE_PERMUTE_TARGET void JoinPermuted(const uint8_t *r, const uint8_t *g, const uint8_t *b,
                                            int64_t n, uint8_t *d) {
+    if (n < 256) return JoinShuffled(r, g, b, n, d);
+    const int64_t phase = static_cast<int64_t>(reinterpret_cast<uintptr_t>(d) & 63);
+    const int64_t h = (((64 - phase) & 63) * 43) & 63;
+    JoinPlain(r, g, b, h, d);
     __m512i first[3], second[3];
     for (int k = 0; k < 3; ++k) {
         first[k] = Load64(kJoinFirst[k].data());
         second[k] = Load64(kJoinSecond[k].data());
     }
-    int64_t i = 0;
+    int64_t i = h;
+    d += 3 * h;
     for (; i + 64 <= n; i += 64, d += 192) {
         const __m512i vr = Load64(r + i);
         const __m512i vg = Load64(g + i);
         const __m512i vb = Load64(b + i);
         for (int k = 0; k < 3; ++k) {
             const __m512i t = _mm512_permutex2var_epi8(vr, first[k], vg);
-            _mm512_storeu_si512(d + 64 * k, _mm512_permutex2var_epi8(t, second[k], vb));
+            _mm512_store_si512(d + 64 * k, _mm512_permutex2var_epi8(t, second[k], vb));
         }
     }
     JoinShuffled(r + i, g + i, b + i, n - i, d);
