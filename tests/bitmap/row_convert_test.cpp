@@ -408,7 +408,8 @@ TEST_F(RowConvert, TrueColourPlanesAtEveryAddressPhase) {
             tessarine::bitmap::SplitRgb(rgb.data() + kPad + from, n, p[0], p[1], p[2]);
             for (int k = 0; k < 3; ++k) {
                 for (int64_t i = 0; i < n; ++i)
-                    ASSERT_EQ(p[k][i], rgb[kPad + from + 3 * i + k]) << n << " " << phase << " " << i;
+                    ASSERT_EQ(p[k][i], rgb[kPad + from + 3 * i + k])
+                        << n << " " << phase << " " << i;
                 for (int64_t i = 0; i < static_cast<int64_t>(planes[k].size()); ++i) {
                     if (planes[k].data() + i < p[k] || planes[k].data() + i >= p[k] + n) {
                         ASSERT_EQ(planes[k][i], kFill) << n << " " << phase << " " << i;
@@ -422,7 +423,8 @@ TEST_F(RowConvert, TrueColourPlanesAtEveryAddressPhase) {
                 if (back.data() + i < out || back.data() + i >= out + 3 * n) {
                     ASSERT_EQ(back[i], kFill) << n << " " << phase << " " << i;
                 } else {
-                    ASSERT_EQ(back[i], rgb[kPad + from + (back.data() + i - out)]) << n << " " << phase;
+                    ASSERT_EQ(back[i], rgb[kPad + from + (back.data() + i - out)])
+                        << n << " " << phase;
                 }
             }
         }
