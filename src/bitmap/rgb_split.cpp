@@ -167,6 +167,65 @@ __attribute__((target("ssse3"))) void JoinCmykShuffled(const uint8_t *const p[4]
     JoinCmykPlain(rest, n - i, d);
 }
 
+// 32 pixels at a time: the same shuffles on two 16-pixel groups at once, one
+// in each half of a 256-bit register.
+#define TESSARINE_WIDE_TARGET __attribute__((target("avx2")))
+
+TESSARINE_WIDE_TARGET inline __m256i Pair(const uint8_t *lo, const uint8_t *hi) {
+    return _mm256_inserti128_si256(
+        _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i *>(lo))),
+        _mm_loadu_si128(reinterpret_cast<const __m128i *>(hi)), 1);
+}
+
+TESSARINE_WIDE_TARGET inline __m256i Both(const Mask &m) {
+    return _mm256_broadcastsi128_si256(
+        _mm_loadu_si128(reinterpret_cast<const __m128i *>(m.data())));
+}
+
+TESSARINE_WIDE_TARGET void SplitWide(const uint8_t *s, int64_t n, uint8_t *r, uint8_t *g,
+                                     uint8_t *b) {
+    __m256i m[9];
+    for (int i = 0; i < 9; ++i) m[i] = Both(kSplit[i]);
+    uint8_t *planes[3] = {r, g, b};
+    int64_t i = 0;
+    for (; i + 32 <= n; i += 32, s += 96) {
+        const __m256i a = Pair(s, s + 48);
+        const __m256i c = Pair(s + 16, s + 64);
+        const __m256i e = Pair(s + 32, s + 80);
+        for (int ch = 0; ch < 3; ++ch) {
+            const __m256i v =
+                _mm256_or_si256(_mm256_or_si256(_mm256_shuffle_epi8(a, m[3 * ch]),
+                                                _mm256_shuffle_epi8(c, m[3 * ch + 1])),
+                                _mm256_shuffle_epi8(e, m[3 * ch + 2]));
+            _mm256_storeu_si256(reinterpret_cast<__m256i *>(planes[ch] + i), v);
+        }
+    }
+    SplitShuffled(s, n - i, r + i, g + i, b + i);
+}
+
+TESSARINE_WIDE_TARGET void JoinWide(const uint8_t *r, const uint8_t *g, const uint8_t *b, int64_t n,
+                                    uint8_t *d) {
+    __m256i m[9];
+    for (int i = 0; i < 9; ++i) m[i] = Both(kJoin[i]);
+    int64_t i = 0;
+    for (; i + 32 <= n; i += 32, d += 96) {
+        const __m256i vr = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(r + i));
+        const __m256i vg = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(g + i));
+        const __m256i vb = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(b + i));
+        __m256i v[3];
+        for (int k = 0; k < 3; ++k)
+            v[k] = _mm256_or_si256(
+                _mm256_or_si256(_mm256_shuffle_epi8(vr, m[k]), _mm256_shuffle_epi8(vg, m[3 + k])),
+                _mm256_shuffle_epi8(vb, m[6 + k]));
+        // Low halves hold the first 16 pixels' 48 bytes, high halves the next.
+        auto *out = reinterpret_cast<__m256i *>(d);
+        _mm256_storeu_si256(out, _mm256_permute2x128_si256(v[0], v[1], 0x20));
+        _mm256_storeu_si256(out + 1, _mm256_permute2x128_si256(v[2], v[0], 0x30));
+        _mm256_storeu_si256(out + 2, _mm256_permute2x128_si256(v[1], v[2], 0x31));
+    }
+    JoinShuffled(r + i, g + i, b + i, n - i, d);
+}
+
 // 64 pixels of 3 bytes at a time with two-table byte permutes: two per
 // plane, against nine shuffles per 16 pixels above.
 using Index64 = std::array<uint8_t, 64>;
@@ -295,26 +354,41 @@ TESSARINE_PERMUTE_TARGET void JoinPermuted(const uint8_t *r, const uint8_t *g, c
 }
 
 const bool kHasShuffle = __builtin_cpu_supports("ssse3");
-const bool kHasPermute = kHasShuffle && __builtin_cpu_supports("avx512f") &&
+const bool kHasWide = kHasShuffle && __builtin_cpu_supports("avx2");
+const bool kHasPermute = kHasWide && __builtin_cpu_supports("avx512f") &&
                          __builtin_cpu_supports("avx512bw") &&
                          __builtin_cpu_supports("avx512vbmi");
 
 #endif
 
+int gPathLimit = kRgbPathPermute;
+
 }  // namespace
+
+int LimitRgbPaths(int fastest) {
+    const int previous = gPathLimit;
+    gPathLimit = fastest;
+    return previous;
+}
 
 void SplitRgb(const uint8_t *pixels, int64_t count, uint8_t *r, uint8_t *g, uint8_t *b) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (kHasPermute) return SplitPermuted(pixels, count, r, g, b);
-    if (kHasShuffle) return SplitShuffled(pixels, count, r, g, b);
+    if (kHasPermute && gPathLimit >= kRgbPathPermute)
+        return SplitPermuted(pixels, count, r, g, b);
+    if (kHasWide && gPathLimit >= kRgbPathWide) return SplitWide(pixels, count, r, g, b);
+    if (kHasShuffle && gPathLimit >= kRgbPathShuffle)
+        return SplitShuffled(pixels, count, r, g, b);
 #endif
     SplitPlain(pixels, count, r, g, b);
 }
 
 void JoinRgb(const uint8_t *r, const uint8_t *g, const uint8_t *b, int64_t count, uint8_t *pixels) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (kHasPermute) return JoinPermuted(r, g, b, count, pixels);
-    if (kHasShuffle) return JoinShuffled(r, g, b, count, pixels);
+    if (kHasPermute && gPathLimit >= kRgbPathPermute)
+        return JoinPermuted(r, g, b, count, pixels);
+    if (kHasWide && gPathLimit >= kRgbPathWide) return JoinWide(r, g, b, count, pixels);
+    if (kHasShuffle && gPathLimit >= kRgbPathShuffle)
+        return JoinShuffled(r, g, b, count, pixels);
 #endif
     JoinPlain(r, g, b, count, pixels);
 }
