@@ -1,7 +1,7 @@
 // 3-byte pixels to planes and back. The vector paths move 64 pixels at a
-// time through two-table byte permutes where the processor has them, or 16
-// through byte shuffles; the plain path is beside them for the rest of a row
-// and for processors without either.
+// time through two-table byte permutes where the processor has them, 32
+// through 256-bit byte shuffles, or 16 through 128-bit ones; the plain path
+// is beside them for the rest of a row and for processors without any.
 #include "bitmap/rgb_split.h"
 
 #include <array>
