@@ -18,6 +18,20 @@ inline bool HasByteShuffle() {
     }();
     return has;
 }
+
+// 256-bit byte shuffles (AVX2).
+inline bool HasWideShuffle() {
+    static const bool has = HasByteShuffle() && __builtin_cpu_supports("avx2") != 0;
+    return has;
+}
+
+// 512-bit byte permutes (AVX-512 VBMI).
+inline bool HasBytePermute() {
+    static const bool has = HasWideShuffle() && __builtin_cpu_supports("avx512f") != 0 &&
+                            __builtin_cpu_supports("avx512bw") != 0 &&
+                            __builtin_cpu_supports("avx512vbmi") != 0;
+    return has;
+}
 #endif
 
 }  // namespace tessarine::bitmap

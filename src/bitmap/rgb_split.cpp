@@ -1,6 +1,7 @@
-// 3-byte pixels to planes and back. The vector path moves 16 pixels at a
-// time through byte shuffles; the plain path is beside it for the rest of a
-// row and for processors without them.
+// 3-byte pixels to planes and back. The vector paths move 64 pixels at a
+// time through two-table byte permutes where the processor has them, 32
+// through 256-bit byte shuffles, or 16 through 128-bit ones; the plain path
+// is beside them for the rest of a row and for processors without any.
 #include "bitmap/rgb_split.h"
 
 #include <array>
@@ -163,20 +164,222 @@ __attribute__((target("ssse3"))) void JoinCmykShuffled(const uint8_t *const p[4]
     JoinCmykPlain(rest, n - i, d);
 }
 
+// 32 pixels at a time: the same shuffles on two 16-pixel groups at once, one
+// in each half of a 256-bit register.
+#define TESSARINE_WIDE_TARGET __attribute__((target("avx2")))
+
+TESSARINE_WIDE_TARGET inline __m256i Pair(const uint8_t *lo, const uint8_t *hi) {
+    return _mm256_inserti128_si256(
+        _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i *>(lo))),
+        _mm_loadu_si128(reinterpret_cast<const __m128i *>(hi)), 1);
+}
+
+TESSARINE_WIDE_TARGET inline __m256i Both(const Mask &m) {
+    return _mm256_broadcastsi128_si256(
+        _mm_loadu_si128(reinterpret_cast<const __m128i *>(m.data())));
+}
+
+TESSARINE_WIDE_TARGET void SplitWide(const uint8_t *s, int64_t n, uint8_t *r, uint8_t *g,
+                                     uint8_t *b) {
+    __m256i m[9];
+    for (int i = 0; i < 9; ++i) m[i] = Both(kSplit[i]);
+    uint8_t *planes[3] = {r, g, b};
+    int64_t i = 0;
+    for (; i + 32 <= n; i += 32, s += 96) {
+        const __m256i a = Pair(s, s + 48);
+        const __m256i c = Pair(s + 16, s + 64);
+        const __m256i e = Pair(s + 32, s + 80);
+        for (int ch = 0; ch < 3; ++ch) {
+            const __m256i v =
+                _mm256_or_si256(_mm256_or_si256(_mm256_shuffle_epi8(a, m[3 * ch]),
+                                                _mm256_shuffle_epi8(c, m[3 * ch + 1])),
+                                _mm256_shuffle_epi8(e, m[3 * ch + 2]));
+            _mm256_storeu_si256(reinterpret_cast<__m256i *>(planes[ch] + i), v);
+        }
+    }
+    SplitShuffled(s, n - i, r + i, g + i, b + i);
+}
+
+TESSARINE_WIDE_TARGET void JoinWide(const uint8_t *r, const uint8_t *g, const uint8_t *b, int64_t n,
+                                    uint8_t *d) {
+    __m256i m[9];
+    for (int i = 0; i < 9; ++i) m[i] = Both(kJoin[i]);
+    int64_t i = 0;
+    for (; i + 32 <= n; i += 32, d += 96) {
+        const __m256i vr = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(r + i));
+        const __m256i vg = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(g + i));
+        const __m256i vb = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(b + i));
+        __m256i v[3];
+        for (int k = 0; k < 3; ++k)
+            v[k] = _mm256_or_si256(
+                _mm256_or_si256(_mm256_shuffle_epi8(vr, m[k]), _mm256_shuffle_epi8(vg, m[3 + k])),
+                _mm256_shuffle_epi8(vb, m[6 + k]));
+        // Low halves hold the first 16 pixels' 48 bytes, high halves the next.
+        auto *out = reinterpret_cast<__m256i *>(d);
+        _mm256_storeu_si256(out, _mm256_permute2x128_si256(v[0], v[1], 0x20));
+        _mm256_storeu_si256(out + 1, _mm256_permute2x128_si256(v[2], v[0], 0x30));
+        _mm256_storeu_si256(out + 2, _mm256_permute2x128_si256(v[1], v[2], 0x31));
+    }
+    JoinShuffled(r + i, g + i, b + i, n - i, d);
+}
+
+// 64 pixels of 3 bytes at a time with two-table byte permutes: two per
+// plane, against nine shuffles per 16 pixels above.
+using Index64 = std::array<uint8_t, 64>;
+
+// Channel c of pixel j from the first two 64-byte pieces (bit 6 picks the
+// second); the bytes of the third piece are placed by the next step.
+constexpr Index64 SplitFirst(int c) {
+    Index64 m{};
+    for (int j = 0; j < 64; ++j) {
+        const int s = 3 * j + c;
+        m[j] = static_cast<uint8_t>(s < 128 ? s : 0);
+    }
+    return m;
+}
+
+// Keeps what the first step placed and takes the rest from the third piece.
+constexpr Index64 SplitSecond(int c) {
+    Index64 m{};
+    for (int j = 0; j < 64; ++j) {
+        const int s = 3 * j + c;
+        m[j] = static_cast<uint8_t>(s < 128 ? j : 64 + (s - 128));
+    }
+    return m;
+}
+
+// Output byte j of 64-byte piece k: from the red or green plane first
+// (bit 6 picks green), then blue from the second step.
+constexpr Index64 JoinFirst(int k) {
+    Index64 m{};
+    for (int j = 0; j < 64; ++j) {
+        const int o = 64 * k + j;
+        m[j] = static_cast<uint8_t>(o % 3 == 2 ? 0 : (o % 3) * 64 + o / 3);
+    }
+    return m;
+}
+
+constexpr Index64 JoinSecond(int k) {
+    Index64 m{};
+    for (int j = 0; j < 64; ++j) {
+        const int o = 64 * k + j;
+        m[j] = static_cast<uint8_t>(o % 3 == 2 ? 64 + o / 3 : j);
+    }
+    return m;
+}
+
+constexpr Index64 Iota() {
+    Index64 m{};
+    for (int j = 0; j < 64; ++j) m[j] = static_cast<uint8_t>(j);
+    return m;
+}
+
+alignas(64) constexpr Index64 kIota = Iota();
+alignas(64) constexpr Index64 kSplitFirst[3] = {SplitFirst(0), SplitFirst(1), SplitFirst(2)};
+alignas(64) constexpr Index64 kSplitSecond[3] = {SplitSecond(0), SplitSecond(1), SplitSecond(2)};
+alignas(64) constexpr Index64 kJoinFirst[3] = {JoinFirst(0), JoinFirst(1), JoinFirst(2)};
+alignas(64) constexpr Index64 kJoinSecond[3] = {JoinSecond(0), JoinSecond(1), JoinSecond(2)};
+
+#define TESSARINE_PERMUTE_TARGET __attribute__((target("avx512f,avx512bw,avx512vbmi")))
+
+TESSARINE_PERMUTE_TARGET inline __m512i Load64(const void *p) { return _mm512_loadu_si512(p); }
+
+// Each plane's stores start on a 64-byte boundary: a store that straddles
+// two cache lines costs about three aligned ones. A plane's 64 bytes are made
+// from the last two blocks of the source, shifted by the plane's phase.
+TESSARINE_PERMUTE_TARGET void SplitPermuted(const uint8_t *s, int64_t n, uint8_t *r, uint8_t *g,
+                                            uint8_t *b) {
+    if (n < 256) return SplitShuffled(s, n, r, g, b);
+    uint8_t *planes[3] = {r, g, b};
+    __m512i first[3], second[3], shift[3], prev[3];
+    int64_t head[3];
+    const __m512i a = Load64(s), c = Load64(s + 64), e = Load64(s + 128);
+    for (int ch = 0; ch < 3; ++ch) {
+        first[ch] = Load64(kSplitFirst[ch].data());
+        second[ch] = Load64(kSplitSecond[ch].data());
+        head[ch] = (64 - static_cast<int64_t>(reinterpret_cast<uintptr_t>(planes[ch]) & 63)) & 63;
+        shift[ch] = _mm512_add_epi8(Load64(kIota.data()),
+                                    _mm512_set1_epi8(static_cast<char>(head[ch])));
+        prev[ch] =
+            _mm512_permutex2var_epi8(_mm512_permutex2var_epi8(a, first[ch], c), second[ch], e);
+    }
+    int64_t i = 64;  // the source block after the one in prev
+    for (; i + 64 <= n; i += 64) {
+        const uint8_t *q = s + 3 * i;
+        const __m512i x = Load64(q), y = Load64(q + 64), z = Load64(q + 128);
+        for (int ch = 0; ch < 3; ++ch) {
+            const __m512i cur =
+                _mm512_permutex2var_epi8(_mm512_permutex2var_epi8(x, first[ch], y), second[ch], z);
+            _mm512_store_si512(planes[ch] + head[ch] + i - 64,
+                               _mm512_permutex2var_epi8(prev[ch], shift[ch], cur));
+            prev[ch] = cur;
+        }
+    }
+    for (int ch = 0; ch < 3; ++ch) {
+        uint8_t *p = planes[ch];
+        for (int64_t k = 0; k < head[ch]; ++k) p[k] = s[3 * k + ch];
+        for (int64_t k = head[ch] + i - 64; k < n; ++k) p[k] = s[3 * k + ch];
+    }
+}
+
+// The stores start on a 64-byte boundary: the first h pixels go the short
+// way, with 3 * h + (d mod 64) a multiple of 64 (43 is the inverse of 3
+// modulo 64).
+TESSARINE_PERMUTE_TARGET void JoinPermuted(const uint8_t *r, const uint8_t *g, const uint8_t *b,
+                                           int64_t n, uint8_t *d) {
+    if (n < 256) return JoinShuffled(r, g, b, n, d);
+    const int64_t phase = static_cast<int64_t>(reinterpret_cast<uintptr_t>(d) & 63);
+    const int64_t h = (((64 - phase) & 63) * 43) & 63;
+    JoinPlain(r, g, b, h, d);
+    __m512i first[3], second[3];
+    for (int k = 0; k < 3; ++k) {
+        first[k] = Load64(kJoinFirst[k].data());
+        second[k] = Load64(kJoinSecond[k].data());
+    }
+    int64_t i = h;
+    d += 3 * h;
+    for (; i + 64 <= n; i += 64, d += 192) {
+        const __m512i vr = Load64(r + i);
+        const __m512i vg = Load64(g + i);
+        const __m512i vb = Load64(b + i);
+        for (int k = 0; k < 3; ++k) {
+            const __m512i t = _mm512_permutex2var_epi8(vr, first[k], vg);
+            _mm512_store_si512(d + 64 * k, _mm512_permutex2var_epi8(t, second[k], vb));
+        }
+    }
+    JoinShuffled(r + i, g + i, b + i, n - i, d);
+}
+
 #endif
+
+int gPathLimit = kRgbPathPermute;
 
 }  // namespace
 
+int LimitRgbPaths(int fastest) {
+    const int previous = gPathLimit;
+    gPathLimit = fastest;
+    return previous;
+}
+
 void SplitRgb(const uint8_t *pixels, int64_t count, uint8_t *r, uint8_t *g, uint8_t *b) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (HasByteShuffle()) return SplitShuffled(pixels, count, r, g, b);
+    if (HasBytePermute() && gPathLimit >= kRgbPathPermute)
+        return SplitPermuted(pixels, count, r, g, b);
+    if (HasWideShuffle() && gPathLimit >= kRgbPathWide) return SplitWide(pixels, count, r, g, b);
+    if (HasByteShuffle() && gPathLimit >= kRgbPathShuffle)
+        return SplitShuffled(pixels, count, r, g, b);
 #endif
     SplitPlain(pixels, count, r, g, b);
 }
 
 void JoinRgb(const uint8_t *r, const uint8_t *g, const uint8_t *b, int64_t count, uint8_t *pixels) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (HasByteShuffle()) return JoinShuffled(r, g, b, count, pixels);
+    if (HasBytePermute() && gPathLimit >= kRgbPathPermute)
+        return JoinPermuted(r, g, b, count, pixels);
+    if (HasWideShuffle() && gPathLimit >= kRgbPathWide) return JoinWide(r, g, b, count, pixels);
+    if (HasByteShuffle() && gPathLimit >= kRgbPathShuffle)
+        return JoinShuffled(r, g, b, count, pixels);
 #endif
     JoinPlain(r, g, b, count, pixels);
 }

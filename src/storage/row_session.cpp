@@ -6,6 +6,7 @@
 #include <algorithm>
 
 #include "core/status.h"
+#include "platform/memory_advice.h"
 #include "storage/row_session.h"
 #include "storage/tile_format.h"
 
@@ -24,6 +25,8 @@ int32_t AllocBuffer(int64_t size, MEM_Handle *handle, uint8_t **buffer) {
     *handle = MEM_AllocHdl(0, static_cast<uint32_t>(size));
     if (*handle == nullptr) return kErrMemory;
     *buffer = static_cast<uint8_t *>(MEM_Lock(*handle));
+    // A band is read whole and streamed through once per band.
+    tessarine::platform::AdviseLargePages(*buffer, static_cast<size_t>(size));
     return kOk;
 }
 

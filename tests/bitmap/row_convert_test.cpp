@@ -9,6 +9,7 @@
 #include <tessarine/tessarine.h>
 
 #include "bitmap/rgb_rows.h"
+#include "bitmap/rgb_split.h"
 #include "row_model.h"
 #include "test_support.h"
 
@@ -379,6 +380,62 @@ TEST_F(RowConvert, LongTrueColourRowsThroughPlanesAndBack) {
                   TS_OK);
         for (int64_t i = 0; i < n; ++i)
             for (int k = 0; k < 4; ++k) ASSERT_EQ(p[k][i], cmyk[4 * i + k]) << n << " " << i;
+    }
+}
+
+}  // namespace
+
+namespace {
+
+// Every 3-byte path this processor has, each plane at every address phase
+// (the widest path aligns its stores), lengths around the block edges, and
+// not a byte written outside the run.
+TEST_F(RowConvert, TrueColourPlanesAtEveryAddressPhase) {
+    constexpr uint8_t kFill = 0xA5;
+    constexpr int64_t kPad = 80;
+    namespace bm = tessarine::bitmap;
+    struct Restore {
+        ~Restore() { bm::LimitRgbPaths(bm::kRgbPathPermute); }
+    } restore;
+    for (int path = bm::kRgbPathPlain; path <= bm::kRgbPathPermute; ++path) {
+        SCOPED_TRACE(path);
+        bm::LimitRgbPaths(path);
+        for (int64_t n : {0, 1, 31, 32, 63, 64, 255, 256, 257, 319, 320, 383, 700, 1024, 1097}) {
+            Bytes rgb(n * 3 + 2 * kPad);
+            for (size_t i = 0; i < rgb.size(); ++i) rgb[i] = static_cast<uint8_t>(i * 7 + 3);
+            for (int64_t phase = 0; phase < 64; phase += (n > 300 ? 9 : 1)) {
+                const int64_t at[3] = {phase, (phase + 17) % 64, (phase + 40) % 64};
+                const int64_t from = phase % 3;
+                Bytes planes[3];
+                uint8_t *p[3];
+                for (int k = 0; k < 3; ++k) {
+                    planes[k].assign(n + 2 * kPad, kFill);
+                    p[k] = planes[k].data() + kPad + at[k];
+                }
+                tessarine::bitmap::SplitRgb(rgb.data() + kPad + from, n, p[0], p[1], p[2]);
+                for (int k = 0; k < 3; ++k) {
+                    for (int64_t i = 0; i < n; ++i)
+                        ASSERT_EQ(p[k][i], rgb[kPad + from + 3 * i + k])
+                            << n << " " << phase << " " << i;
+                    for (int64_t i = 0; i < static_cast<int64_t>(planes[k].size()); ++i) {
+                        if (planes[k].data() + i < p[k] || planes[k].data() + i >= p[k] + n) {
+                            ASSERT_EQ(planes[k][i], kFill) << n << " " << phase << " " << i;
+                        }
+                    }
+                }
+                Bytes back(n * 3 + 2 * kPad, kFill);
+                uint8_t *out = back.data() + kPad + phase;
+                tessarine::bitmap::JoinRgb(p[0], p[1], p[2], n, out);
+                for (int64_t i = 0; i < static_cast<int64_t>(back.size()); ++i) {
+                    if (back.data() + i < out || back.data() + i >= out + 3 * n) {
+                        ASSERT_EQ(back[i], kFill) << n << " " << phase << " " << i;
+                    } else {
+                        ASSERT_EQ(back[i], rgb[kPad + from + (back.data() + i - out)])
+                            << n << " " << phase;
+                    }
+                }
+            }
+        }
     }
 }
 
