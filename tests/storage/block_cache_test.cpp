@@ -12,12 +12,8 @@ namespace {
 using namespace blocktest;
 using tessarine::StatusOf;
 
-class BlockCacheTest : public tstest::Sandbox {
+class BlockCacheTest : public BlockFileFixture {
   protected:
-    void Make(uint8_t limit, uint32_t payload = 24) {
-        path_ = Path("c.blk");
-        ASSERT_EQ(StatusOf(FM_BlockFileCreate(path_.c_str(), &file_, payload, limit, nullptr)), 10);
-    }
     // Appends `n` new blocks to the chain, each one filled with its index.
     void Grow(int n) {
         for (int i = 0; i < n; ++i) {
@@ -27,17 +23,6 @@ class BlockCacheTest : public tstest::Sandbox {
             std::memset(Data(node), int(node->index), file_->header.payloadSize);
         }
     }
-    void Reopen(uint8_t limit) {
-        ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
-        ASSERT_EQ(StatusOf(FM_BlockFileOpen(path_.c_str(), &file_, limit)), 10);
-    }
-    void TearDown() override {
-        if (file_ != nullptr) FM_BlockFileClose(&file_);
-        FM_Delete(path_.c_str());
-        tstest::Sandbox::TearDown();
-    }
-    std::string path_;
-    FM_BlockFile *file_ = nullptr;
 };
 
 TEST_F(BlockCacheTest, LimitZeroFailsEveryNodeRequest) {

@@ -11,12 +11,8 @@ namespace {
 using namespace blocktest;
 using tessarine::StatusOf;
 
-class BlockChainTest : public tstest::Sandbox {
+class BlockChainTest : public BlockFileFixture {
   protected:
-    void Make(uint8_t limit, uint32_t payload = 24) {
-        path_ = Path("c.blk");
-        ASSERT_EQ(StatusOf(FM_BlockFileCreate(path_.c_str(), &file_, payload, limit, nullptr)), 10);
-    }
     uint32_t Add(uint32_t after) {
         FM_MemBlock *node = nullptr;
         EXPECT_EQ(StatusOf(FM_NewBlock(file_, &node)), 10);
@@ -28,17 +24,6 @@ class BlockChainTest : public tstest::Sandbox {
         EXPECT_EQ(StatusOf(FM_GetFileBlockHdrByIndex(file_, index, &h)), 10);
         return h;
     }
-    void Reopen(uint8_t limit) {
-        ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
-        ASSERT_EQ(StatusOf(FM_BlockFileOpen(path_.c_str(), &file_, limit)), 10);
-    }
-    void TearDown() override {
-        if (file_ != nullptr) FM_BlockFileClose(&file_);
-        FM_Delete(path_.c_str());
-        tstest::Sandbox::TearDown();
-    }
-    std::string path_;
-    FM_BlockFile *file_ = nullptr;
 };
 
 TEST_F(BlockChainTest, NewBlockStartsUnlinkedDirtyWithNoTag) {

@@ -10,7 +10,12 @@
 #include <string>
 #include <vector>
 
+#include <gtest/gtest.h>
+
 #include <tessarine/storage.h>
+
+#include "core/status.h"
+#include "test_support.h"
 
 namespace blocktest {
 
@@ -73,6 +78,28 @@ inline FM_TagHdr Tag(uint8_t kind, uint32_t length) {
     h.length = length;
     return h;
 }
+
+// A block file made in the test's sandbox, closed and removed at the end.
+class BlockFileFixture : public tstest::Sandbox {
+  protected:
+    void Make(uint8_t limit, uint32_t payload = 24) {
+        path_ = Path("c.blk");
+        ASSERT_EQ(tessarine::StatusOf(
+                      FM_BlockFileCreate(path_.c_str(), &file_, payload, limit, nullptr)),
+                  10);
+    }
+    void Reopen(uint8_t limit) {
+        ASSERT_EQ(tessarine::StatusOf(FM_BlockFileClose(&file_)), 10);
+        ASSERT_EQ(tessarine::StatusOf(FM_BlockFileOpen(path_.c_str(), &file_, limit)), 10);
+    }
+    void TearDown() override {
+        if (file_ != nullptr) FM_BlockFileClose(&file_);
+        FM_Delete(path_.c_str());
+        tstest::Sandbox::TearDown();
+    }
+    std::string path_;
+    FM_BlockFile *file_ = nullptr;
+};
 
 }  // namespace blocktest
 
