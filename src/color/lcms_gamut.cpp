@@ -122,9 +122,7 @@ long LcmsProjectOntoGamut(char const *source, char const *device, char const *de
                         : 0;
         }
         done += run;
-        if (progress != nullptr &&
-            !progress(static_cast<int>(static_cast<int64_t>(done) * 100 / in->count), progressData))
-            return XQ_ERR_CANCELLED;
+        if (ProgressSaysStop(progress, progressData, done, in->count)) return XQ_ERR_CANCELLED;
     }
     return XQ_OK;
 }

@@ -90,9 +90,7 @@ long LcmsMatchColors(char const *source, char const *destination, char const *pr
                        to + static_cast<size_t>(done) * outLayout.bytesPerColour,
                        static_cast<cmsUInt32Number>(run));
         done += run;
-        if (progress != nullptr &&
-            !progress(static_cast<int>(static_cast<int64_t>(done) * 100 / in->count), progressData))
-            return XQ_ERR_CANCELLED;
+        if (ProgressSaysStop(progress, progressData, done, in->count)) return XQ_ERR_CANCELLED;
     }
     return XQ_OK;
 }

@@ -101,4 +101,12 @@ int LcmsIntent(int intent);
 // Colours per run between progress calls.
 inline constexpr int32_t kColoursPerRun = 65536;
 
+// Tells the caller's progress callback how far a run of `count` colours has
+// come; true when it asks to stop.
+inline bool ProgressSaysStop(XQProgressFn progress, void *progressData, int32_t done,
+                             int32_t count) {
+    return progress != nullptr &&
+           !progress(static_cast<int>(static_cast<int64_t>(done) * 100 / count), progressData);
+}
+
 }  // namespace tessarine::color

@@ -107,6 +107,23 @@ int32_t WriteMergedArc(void *out, const BZ_Point &a, const BZ_Point &e, const Ci
     return kOk;
 }
 
+// The arc attempt's last step: when the circle's end directions agree with
+// the operands', the merged arc is written and the outcome set.
+int32_t MergeArcIfEndsAgree(const Circle &k, const BZ_Point &atStart, const BZ_Point &atEnd,
+                            const BZ_Point &a, const BZ_Point &e, void *out, int16_t *outcome,
+                            bool *merged) {
+    *merged = false;
+    int32_t status = EndsAgree(k, atStart, atEnd, merged);
+    if (Failed(status) || !*merged) return status;
+    status = WriteMergedArc(out, a, e, k);
+    if (Failed(status)) {
+        *merged = false;
+        return status;
+    }
+    *outcome = kMerged;
+    return kOk;
+}
+
 }  // namespace
 
 extern "C" {
@@ -196,15 +213,9 @@ TESSARINE_API int32_t Mergelnarc(const void *first, const void *second, int16_t 
     Circle k;
     if (CircleThrough(a, j, e, w1, w2, &k) && OnCircle(k.centre, k.radius, p1, tolerance) &&
         OnCircle(k.centre, k.radius, p2, tolerance)) {
-        bool agree = false;
-        status = EndsAgree(k, d1, d2, &agree);
-        if (Failed(status)) return status;
-        if (agree) {
-            status = WriteMergedArc(out, a, e, k);
-            if (Failed(status)) return status;
-            *outcome = kMerged;
-            return kOk;
-        }
+        bool merged = false;
+        status = MergeArcIfEndsAgree(k, d1, d2, a, e, out, outcome, &merged);
+        if (Failed(status) || merged) return status;
     }
     if (asLine == nullptr) return kOk;
     if (!(DistanceToCarrier(j, a, e) <= tolerance)) return kOk;
@@ -291,15 +302,9 @@ TESSARINE_API int32_t Mergearcarc(const BZ_Arc *arc1, const BZ_Arc *arc2, double
         }
     }
     if (arcOk) {
-        bool agree = false;
-        status = EndsAgree(k, t1s, t2e, &agree);
-        if (Failed(status)) return status;
-        if (agree) {
-            status = WriteMergedArc(out, a, e, k);
-            if (Failed(status)) return status;
-            *outcome = kMerged;
-            return kOk;
-        }
+        bool merged = false;
+        status = MergeArcIfEndsAgree(k, t1s, t2e, a, e, out, outcome, &merged);
+        if (Failed(status) || merged) return status;
     }
     if (asLine == nullptr) return kOk;
     if (!(DistanceToCarrier(m1, a, e) <= tolerance && DistanceToCarrier(j, a, e) <= tolerance &&
