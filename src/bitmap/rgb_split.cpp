@@ -1,5 +1,5 @@
 // 3-byte pixels to planes and back. The vector paths move 64 pixels at a
-// time through two-table byte permutes where the processor has them, 32
+// time through 64-byte permutes where the processor has them, 32
 // through 256-bit byte shuffles, or 16 through 128-bit ones; the plain path
 // is beside them for the rest of a row and for processors without any.
 #include "bitmap/rgb_split.h"
@@ -223,28 +223,39 @@ TESSARINE_WIDE_TARGET void JoinWide(const uint8_t *r, const uint8_t *g, const ui
     JoinShuffled(r + i, g + i, b + i, n - i, d);
 }
 
-// 64 pixels of 3 bytes at a time with two-table byte permutes: two per
-// plane, against nine shuffles per 16 pixels above.
+// 64 pixels of 3 bytes at a time with byte permutes over whole 64-byte
+// registers, against nine shuffles per 16 pixels above.
 using Index64 = std::array<uint8_t, 64>;
 
-// Channel c of pixel j from the first two 64-byte pieces (bit 6 picks the
-// second); the bytes of the third piece are placed by the next step.
-constexpr Index64 SplitFirst(int c) {
+// The split works on 64 pixels, three 64-byte source pieces. One
+// single-table permute per piece sorts its bytes by plane, each plane's run
+// at its own place: red from slot 0, blue from slot 22, green from slot 43
+// in the first piece, and so on round the register, so that for every
+// plane the three pieces' runs fill the 64 slots without overlapping. Two
+// masked blends then give each plane whole, turned by its start slot; the
+// permute that aligns a plane's stores also undoes the turn.
+inline constexpr int kPlaneTurn[3] = {0, 43, 22};
+
+// Plane c's pixel in slot t of the sorted pieces, and the source byte
+// that holds it.
+constexpr int PlanePixel(int c, int t) { return (t - kPlaneTurn[c]) & 63; }
+constexpr int SourceByte(int c, int t) { return 3 * PlanePixel(c, t) + c; }
+
+// Piece k's sort: slot t takes the byte of whichever plane has its pixel
+// for slot t in piece k.
+constexpr Index64 SortPiece(int k) {
     Index64 m{};
-    for (int j = 0; j < 64; ++j) {
-        const int s = 3 * j + c;
-        m[j] = static_cast<uint8_t>(s < 128 ? s : 0);
-    }
+    for (int t = 0; t < 64; ++t)
+        for (int c = 0; c < 3; ++c)
+            if (SourceByte(c, t) / 64 == k) m[t] = static_cast<uint8_t>(SourceByte(c, t) & 63);
     return m;
 }
 
-// Keeps what the first step placed and takes the rest from the third piece.
-constexpr Index64 SplitSecond(int c) {
-    Index64 m{};
-    for (int j = 0; j < 64; ++j) {
-        const int s = 3 * j + c;
-        m[j] = static_cast<uint8_t>(s < 128 ? j : 64 + (s - 128));
-    }
+// The slots where plane c takes piece k.
+constexpr uint64_t PieceSlots(int c, int k) {
+    uint64_t m = 0;
+    for (int t = 0; t < 64; ++t)
+        if (SourceByte(c, t) / 64 == k) m |= uint64_t{1} << t;
     return m;
 }
 
@@ -268,15 +279,10 @@ constexpr Index64 JoinSecond(int k) {
     return m;
 }
 
-constexpr Index64 Iota() {
-    Index64 m{};
-    for (int j = 0; j < 64; ++j) m[j] = static_cast<uint8_t>(j);
-    return m;
-}
-
-alignas(64) constexpr Index64 kIota = Iota();
-alignas(64) constexpr Index64 kSplitFirst[3] = {SplitFirst(0), SplitFirst(1), SplitFirst(2)};
-alignas(64) constexpr Index64 kSplitSecond[3] = {SplitSecond(0), SplitSecond(1), SplitSecond(2)};
+// With these turns every slot takes the same byte offset from each piece, so
+// one index sorts all three.
+alignas(64) constexpr Index64 kSortPiece = SortPiece(0);
+static_assert(SortPiece(1) == kSortPiece && SortPiece(2) == kSortPiece);
 alignas(64) constexpr Index64 kJoinFirst[3] = {JoinFirst(0), JoinFirst(1), JoinFirst(2)};
 alignas(64) constexpr Index64 kJoinSecond[3] = {JoinSecond(0), JoinSecond(1), JoinSecond(2)};
 
@@ -284,43 +290,75 @@ alignas(64) constexpr Index64 kJoinSecond[3] = {JoinSecond(0), JoinSecond(1), Jo
 
 TESSARINE_PERMUTE_TARGET inline __m512i Load64(const void *p) { return _mm512_loadu_si512(p); }
 
+// Takes 64 bytes of plane c from two turned blocks: from pixel `head` of the
+// first on, so that the stores start on a 64-byte boundary.
+inline Index64 AlignIndex(int c, int64_t head) {
+    Index64 index{};
+    for (int j = 0; j < 64; ++j) {
+        const int64_t p = head + j;
+        index[j] = static_cast<uint8_t>((p < 64 ? 0 : 64) + ((p + kPlaneTurn[c]) & 63));
+    }
+    return index;
+}
+
+// GCC 12's single-table permute leaves a dummy operand unset, and warns of
+// it wherever the permute is inlined.
+#if defined(__GNUC__) && !defined(__clang__)
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Wmaybe-uninitialized"
+#endif
+
 // Each plane's stores start on a 64-byte boundary: a store that straddles
-// two cache lines costs about three aligned ones. A plane's 64 bytes are made
-// from the last two blocks of the source, shifted by the plane's phase.
+// two cache lines costs about three aligned ones. The first pixels of a
+// plane, up to its boundary, go the short way. The loop names every register
+// on its own, so that nothing of it lives on the stack.
 TESSARINE_PERMUTE_TARGET void SplitPermuted(const uint8_t *s, int64_t n, uint8_t *r, uint8_t *g,
                                             uint8_t *b) {
     if (n < 256) return SplitShuffled(s, n, r, g, b);
-    uint8_t *planes[3] = {r, g, b};
-    __m512i first[3], second[3], shift[3], prev[3];
-    int64_t head[3];
-    const __m512i a = Load64(s), c = Load64(s + 64), e = Load64(s + 128);
-    for (int ch = 0; ch < 3; ++ch) {
-        first[ch] = Load64(kSplitFirst[ch].data());
-        second[ch] = Load64(kSplitSecond[ch].data());
-        head[ch] = (64 - static_cast<int64_t>(reinterpret_cast<uintptr_t>(planes[ch]) & 63)) & 63;
-        shift[ch] = _mm512_add_epi8(Load64(kIota.data()),
-                                    _mm512_set1_epi8(static_cast<char>(head[ch])));
-        prev[ch] =
-            _mm512_permutex2var_epi8(_mm512_permutex2var_epi8(a, first[ch], c), second[ch], e);
-    }
-    int64_t i = 64;  // the source block after the one in prev
+    const auto headOf = [](const uint8_t *p) {
+        return (64 - static_cast<int64_t>(reinterpret_cast<uintptr_t>(p) & 63)) & 63;
+    };
+    const int64_t hr = headOf(r), hg = headOf(g), hb = headOf(b);
+    alignas(64) const Index64 align[3] = {AlignIndex(0, hr), AlignIndex(1, hg), AlignIndex(2, hb)};
+    const __m512i ar = Load64(align[0].data()), ag = Load64(align[1].data()),
+                  ab = Load64(align[2].data());
+    const __m512i sort = Load64(kSortPiece.data());
+    const __mmask64 r1 = PieceSlots(0, 1), r2 = PieceSlots(0, 2), g1 = PieceSlots(1, 1),
+                    g2 = PieceSlots(1, 2), b1 = PieceSlots(2, 1), b2 = PieceSlots(2, 2);
+    __m512i x = _mm512_permutexvar_epi8(sort, Load64(s));
+    __m512i y = _mm512_permutexvar_epi8(sort, Load64(s + 64));
+    __m512i z = _mm512_permutexvar_epi8(sort, Load64(s + 128));
+    __m512i pr = _mm512_mask_blend_epi8(r2, _mm512_mask_blend_epi8(r1, x, y), z);
+    __m512i pg = _mm512_mask_blend_epi8(g2, _mm512_mask_blend_epi8(g1, x, y), z);
+    __m512i pb = _mm512_mask_blend_epi8(b2, _mm512_mask_blend_epi8(b1, x, y), z);
+    int64_t i = 64;  // the source block after the one in pr, pg, pb
     for (; i + 64 <= n; i += 64) {
         const uint8_t *q = s + 3 * i;
-        const __m512i x = Load64(q), y = Load64(q + 64), z = Load64(q + 128);
-        for (int ch = 0; ch < 3; ++ch) {
-            const __m512i cur =
-                _mm512_permutex2var_epi8(_mm512_permutex2var_epi8(x, first[ch], y), second[ch], z);
-            _mm512_store_si512(planes[ch] + head[ch] + i - 64,
-                               _mm512_permutex2var_epi8(prev[ch], shift[ch], cur));
-            prev[ch] = cur;
-        }
+        x = _mm512_permutexvar_epi8(sort, Load64(q));
+        y = _mm512_permutexvar_epi8(sort, Load64(q + 64));
+        z = _mm512_permutexvar_epi8(sort, Load64(q + 128));
+        const __m512i cr = _mm512_mask_blend_epi8(r2, _mm512_mask_blend_epi8(r1, x, y), z);
+        const __m512i cg = _mm512_mask_blend_epi8(g2, _mm512_mask_blend_epi8(g1, x, y), z);
+        const __m512i cb = _mm512_mask_blend_epi8(b2, _mm512_mask_blend_epi8(b1, x, y), z);
+        _mm512_store_si512(r + hr + i - 64, _mm512_permutex2var_epi8(pr, ar, cr));
+        _mm512_store_si512(g + hg + i - 64, _mm512_permutex2var_epi8(pg, ag, cg));
+        _mm512_store_si512(b + hb + i - 64, _mm512_permutex2var_epi8(pb, ab, cb));
+        pr = cr;
+        pg = cg;
+        pb = cb;
     }
-    for (int ch = 0; ch < 3; ++ch) {
-        uint8_t *p = planes[ch];
-        for (int64_t k = 0; k < head[ch]; ++k) p[k] = s[3 * k + ch];
-        for (int64_t k = head[ch] + i - 64; k < n; ++k) p[k] = s[3 * k + ch];
+    uint8_t *planes[3] = {r, g, b};
+    const int64_t heads[3] = {hr, hg, hb};
+    for (int c = 0; c < 3; ++c) {
+        uint8_t *p = planes[c];
+        for (int64_t k = 0; k < heads[c]; ++k) p[k] = s[3 * k + c];
+        for (int64_t k = heads[c] + i - 64; k < n; ++k) p[k] = s[3 * k + c];
     }
 }
+
+#if defined(__GNUC__) && !defined(__clang__)
+#pragma GCC diagnostic pop
+#endif
 
 // The stores start on a 64-byte boundary: the first h pixels go the short
 // way, with 3 * h + (d mod 64) a multiple of 64 (43 is the inverse of 3
