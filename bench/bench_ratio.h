@@ -18,6 +18,31 @@ struct RatioPair {
     double target;  // printed beside the ratio; 0 for none
 };
 
+// A ratio a benchmark measured itself, e.g. from runs of its subject and its
+// baseline taken in turn.
+struct MeasuredRatio {
+    std::string name;
+    double ratio;
+    double target;
+};
+
+inline std::vector<MeasuredRatio> &Measured() {
+    static std::vector<MeasuredRatio> ratios;
+    return ratios;
+}
+
+inline void RecordRatio(const std::string &name, double ratio, double target = 0) {
+    Measured().push_back({name, ratio, target});
+}
+
+inline void PrintRatio(const std::string &what, double ratio, double target) {
+    if (target > 0)
+        std::printf("ratio %s: %.3f (target %.2f: %s)\n", what.c_str(), ratio, target,
+                    ratio >= target ? "met" : "NOT met");
+    else
+        std::printf("ratio %s: %.3f\n", what.c_str(), ratio);
+}
+
 inline std::vector<RatioPair> &Pairs() {
     static std::vector<RatioPair> pairs;
     return pairs;
@@ -40,19 +65,14 @@ class CapturingReporter : public benchmark::ConsoleReporter {
         ConsoleReporter::ReportRuns(runs);
     }
     void PrintRatios() const {
+        std::printf("\n");  // after the console's last colour reset
         for (const RatioPair &p : Pairs()) {
             auto m = times_.find(p.measured);
             auto b = times_.find(p.baseline);
             if (m == times_.end() || b == times_.end() || m->second <= 0) continue;
-            const double ratio = b->second / m->second;
-            if (p.target > 0)
-                std::printf("ratio %s vs %s: %.3f (target %.2f: %s)\n", p.measured.c_str(),
-                            p.baseline.c_str(), ratio, p.target,
-                            ratio >= p.target ? "met" : "NOT met");
-            else
-                std::printf("ratio %s vs %s: %.3f\n", p.measured.c_str(), p.baseline.c_str(),
-                            ratio);
+            PrintRatio(p.measured + " vs " + p.baseline, b->second / m->second, p.target);
         }
+        for (const MeasuredRatio &r : Measured()) PrintRatio(r.name, r.ratio, r.target);
     }
 
   private:

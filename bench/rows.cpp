@@ -5,6 +5,8 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <chrono>
 #include <cstdio>
 #include <cstring>
 #include <string>
@@ -90,6 +92,34 @@ void BM_GetRGBRowTileSession(benchmark::State &state) {
         benchmark::DoNotOptimize(im.r.data());
     }
     state.SetBytesProcessed(state.iterations() * kRowBytes * kSide);
+}
+
+// The session and the raw read taken in turn, so that both meet the same
+// load on a shared machine; the median of the per-pair ratios is reported.
+void BM_TileSessionPairedWithRawRead(benchmark::State &state) {
+    Images &im = Shared();
+    BI_Bitmap *t = im.Tiled();
+    const auto budget = static_cast<int32_t>(state.range(0));
+    std::vector<double> ratios;
+    for (auto _ : state) {
+        const auto t0 = std::chrono::steady_clock::now();
+        benchmark::DoNotOptimize(im.RawRead());
+        const auto t1 = std::chrono::steady_clock::now();
+        HVT_TileFileRowIOBegin(1, t, nullptr, 2, 0, budget);
+        for (int32_t y = 0; y < kSide; ++y)
+            BI_GetRGBRow(t, y, 0, kSide, im.r.data(), im.g.data(), im.b.data());
+        HVT_TileFileRowColIOEnd(t);
+        benchmark::DoNotOptimize(im.r.data());
+        const auto t2 = std::chrono::steady_clock::now();
+        const std::chrono::duration<double> raw = t1 - t0, session = t2 - t1;
+        state.SetIterationTime(session.count());
+        ratios.push_back(raw.count() / session.count());
+    }
+    std::sort(ratios.begin(), ratios.end());
+    tsbench::RecordRatio("BI_GetRGBRow mode-2 session, budget " + std::to_string(budget) +
+                             ", vs raw read, median of " + std::to_string(ratios.size()) +
+                             " pairs taken in turn",
+                         ratios[ratios.size() / 2], 0.7);
 }
 
 void BM_MemcpyRowsOut(benchmark::State &state) {
@@ -185,6 +215,7 @@ void BM_PackBWRow(benchmark::State &state) {
 BENCHMARK(BM_RawReadTileFile)->Unit(benchmark::kMillisecond)->MinTime(2);
 // The default budget (bands of 512 rows here) and budgets whose bands stay in cache.
 BENCHMARK(BM_GetRGBRowTileSession)->Unit(benchmark::kMillisecond)->MinTime(2)->Arg(0)->Arg(1 << 20)->Arg(4 << 20);
+BENCHMARK(BM_TileSessionPairedWithRawRead)->Unit(benchmark::kMillisecond)->UseManualTime()->Iterations(15)->Arg(0)->Arg(1 << 20);
 BENCHMARK(BM_MemcpyRowsOut)->Unit(benchmark::kMillisecond)->MinTime(1);
 BENCHMARK(BM_GetRGBRowMemory)->Unit(benchmark::kMillisecond)->MinTime(1);
 BENCHMARK(BM_MemcpyRowsIn)->Unit(benchmark::kMillisecond)->MinTime(1);
@@ -207,17 +238,3 @@ const bool kRatios = [] {
 }  // namespace
 
 TSBENCH_MAIN()
-namespace {
-void BM_BandReadsOnly(benchmark::State &state) {
-    Images &im = Shared();
-    BI_Bitmap *t = im.Tiled();
-    for (auto _ : state) {
-        HVT_TileFileRowIOBegin(1, t, nullptr, 2, 0, static_cast<int32_t>(state.range(0)));
-        const int32_t rows = t->ioSession->bandRows;
-        for (int32_t y = 0; y < kSide; y += rows)
-            BI_GetRGBRow(t, y, 0, 16, im.r.data(), im.g.data(), im.b.data());
-        HVT_TileFileRowColIOEnd(t);
-    }
-}
-BENCHMARK(BM_BandReadsOnly)->Unit(benchmark::kMillisecond)->Arg(0)->Arg(1 << 21);
-}
