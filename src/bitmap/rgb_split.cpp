@@ -308,6 +308,12 @@ inline Index64 AlignIndex(int c, int64_t head) {
 #pragma GCC diagnostic ignored "-Wmaybe-uninitialized"
 #endif
 
+// One plane of a block, turned, from the three sorted pieces.
+TESSARINE_PERMUTE_TARGET inline __m512i Assemble(__m512i x, __m512i y, __m512i z,
+                                                 __mmask64 fromSecond, __mmask64 fromThird) {
+    return _mm512_mask_blend_epi8(fromThird, _mm512_mask_blend_epi8(fromSecond, x, y), z);
+}
+
 // Each plane's stores start on a 64-byte boundary: a store that straddles
 // two cache lines costs about three aligned ones. The first pixels of a
 // plane, up to its boundary, go the short way. The loop names every register
@@ -328,18 +334,18 @@ TESSARINE_PERMUTE_TARGET void SplitPermuted(const uint8_t *s, int64_t n, uint8_t
     __m512i x = _mm512_permutexvar_epi8(sort, Load64(s));
     __m512i y = _mm512_permutexvar_epi8(sort, Load64(s + 64));
     __m512i z = _mm512_permutexvar_epi8(sort, Load64(s + 128));
-    __m512i pr = _mm512_mask_blend_epi8(r2, _mm512_mask_blend_epi8(r1, x, y), z);
-    __m512i pg = _mm512_mask_blend_epi8(g2, _mm512_mask_blend_epi8(g1, x, y), z);
-    __m512i pb = _mm512_mask_blend_epi8(b2, _mm512_mask_blend_epi8(b1, x, y), z);
+    __m512i pr = Assemble(x, y, z, r1, r2);
+    __m512i pg = Assemble(x, y, z, g1, g2);
+    __m512i pb = Assemble(x, y, z, b1, b2);
     int64_t i = 64;  // the source block after the one in pr, pg, pb
     for (; i + 64 <= n; i += 64) {
         const uint8_t *q = s + 3 * i;
         x = _mm512_permutexvar_epi8(sort, Load64(q));
         y = _mm512_permutexvar_epi8(sort, Load64(q + 64));
         z = _mm512_permutexvar_epi8(sort, Load64(q + 128));
-        const __m512i cr = _mm512_mask_blend_epi8(r2, _mm512_mask_blend_epi8(r1, x, y), z);
-        const __m512i cg = _mm512_mask_blend_epi8(g2, _mm512_mask_blend_epi8(g1, x, y), z);
-        const __m512i cb = _mm512_mask_blend_epi8(b2, _mm512_mask_blend_epi8(b1, x, y), z);
+        const __m512i cr = Assemble(x, y, z, r1, r2);
+        const __m512i cg = Assemble(x, y, z, g1, g2);
+        const __m512i cb = Assemble(x, y, z, b1, b2);
         _mm512_store_si512(r + hr + i - 64, _mm512_permutex2var_epi8(pr, ar, cr));
         _mm512_store_si512(g + hg + i - 64, _mm512_permutex2var_epi8(pg, ag, cg));
         _mm512_store_si512(b + hb + i - 64, _mm512_permutex2var_epi8(pb, ab, cb));
