@@ -136,6 +136,38 @@ TESSARINE_API int32_t BI_GetBWPackedRow(BI_Bitmap *bitmap, int32_t y, int32_t x,
 TESSARINE_API int32_t BI_SetBWPackedRow(int32_t y, int32_t x, int32_t count, const uint8_t *packed,
                                         BI_Bitmap *bitmap);
 
+/* Columns: count pixels down column x, from the top or from the bottom. The
+   unpacking reads pixel i at first + i * stride (from the bottom, output 0 is
+   the lowest pixel); x gives the pixel's place in its byte. */
+TESSARINE_API int32_t BI_UnpackRGBColTopdown(uint8_t imageType, uint8_t bitsPerPixel,
+                                             MEM_Handle table, int32_t stride,
+                                             const uint8_t *first, int32_t x, int32_t count,
+                                             uint8_t *r, uint8_t *g, uint8_t *b);
+TESSARINE_API int32_t BI_UnpackRGBColBottomup(uint8_t imageType, uint8_t bitsPerPixel,
+                                              MEM_Handle table, int32_t stride,
+                                              const uint8_t *first, int32_t x, int32_t count,
+                                              uint8_t *r, uint8_t *g, uint8_t *b);
+TESSARINE_API int32_t BI_GetRGBColTopdown(BI_Bitmap *bitmap, int32_t x, int32_t y, int32_t count,
+                                          uint8_t *r, uint8_t *g, uint8_t *b);
+TESSARINE_API int32_t BI_GetRGBColBottomup(BI_Bitmap *bitmap, int32_t x, int32_t y, int32_t count,
+                                           uint8_t *r, uint8_t *g, uint8_t *b);
+TESSARINE_API int32_t BI_UnpackGColTopdown(uint8_t imageType, uint8_t colorModel,
+                                           uint8_t bitsPerPixel, MEM_Handle table, int32_t stride,
+                                           const uint8_t *first, int32_t x, int32_t count,
+                                           uint8_t *out);
+TESSARINE_API int32_t BI_UnpackGColBottomup(uint8_t imageType, uint8_t colorModel,
+                                            uint8_t bitsPerPixel, MEM_Handle table, int32_t stride,
+                                            const uint8_t *first, int32_t x, int32_t count,
+                                            uint8_t *out);
+TESSARINE_API int32_t BI_GetGColTopdown(BI_Bitmap *bitmap, int32_t x, int32_t y, int32_t count,
+                                        uint8_t *out);
+TESSARINE_API int32_t BI_GetGColBottomup(BI_Bitmap *bitmap, int32_t x, int32_t y, int32_t count,
+                                         uint8_t *out);
+/* Pixel (x, y) of a 1-bit bitmap in memory, given its first byte and stride:
+   operation 0 sets it, 2 flips it, and 1 clears the whole byte that holds it. */
+TESSARINE_API int32_t BI_PixelOpBWBmp(int32_t x, int32_t y, int32_t operation, int32_t stride,
+                                      uint8_t *first);
+
 TESSARINE_END_C
 
 #endif
