@@ -227,6 +227,42 @@ TESSARINE_API int32_t BI_GetGColBottomup(BI_Bitmap *bitmap, int32_t x, int32_t y
 TESSARINE_API int32_t BI_PixelOpBWBmp(int32_t x, int32_t y, int32_t operation, int32_t stride,
                                       uint8_t *first);
 
+/* ---- Whole bitmaps: copy, fill, conversion, DIBs ---------------------------- */
+
+/* The colour match of BI_CopyBmpToRGBTrueColor: the four profile paths in the
+   order R27_XQMatchColors takes them (the second is kept with the
+   destination), then its rendering intent and flag word, handed on as they
+   are. */
+typedef struct BI_ColorMatch {
+    AFilePath *source;
+    AFilePath *destination;
+    AFilePath *proofing;
+    AFilePath *abstractProfile;
+    int32_t intent;
+    uint32_t flags;
+} BI_ColorMatch;
+
+/* Rectangles are not clipped: they must lie inside their bitmaps. A
+   sub-bitmap number matters only for a bitmap in a tile file. */
+TESSARINE_API int32_t BI_CopyBmp(const RECT *sourceRect, BI_Bitmap *source,
+                                 const RECT *destinationRect, BI_Bitmap *destination,
+                                 uint8_t sourceSub, uint8_t destinationSub);
+/* The destination must be RGB true colour; match may be null. */
+TESSARINE_API int32_t BI_CopyBmpToRGBTrueColor(const RECT *sourceRect, BI_Bitmap *source,
+                                               const RECT *destinationRect,
+                                               BI_Bitmap *destination, uint8_t sourceSub,
+                                               uint8_t destinationSub,
+                                               const BI_ColorMatch *match);
+TESSARINE_API int32_t BI_FillBmp(BI_Bitmap *bitmap, uint8_t r, uint8_t g, uint8_t b);
+TESSARINE_API int32_t BI_ConvertBmpToMem(BI_Bitmap *bitmap);
+TESSARINE_API int32_t BI_ConvertBmpToTiledFile(BI_Bitmap *bitmap);
+/* One pointer block, freed with MEM_FreePtr: the header, the palette (blue,
+   green, red, 0 for each colour), then room for the pixels, not cleared. */
+TESSARINE_API int32_t BI_CreateDIB(uint8_t bitsPerPixel, int32_t width, int32_t height,
+                                   int32_t count, const uint8_t *colors, BITMAPINFOHEADER **out);
+TESSARINE_API int32_t BI_CreateDIBFromBmp(const BI_Bitmap *bitmap, const RECT *rect,
+                                          BITMAPINFOHEADER **out);
+
 TESSARINE_END_C
 
 #endif
