@@ -49,8 +49,17 @@ int32_t BeginCopyTransfers(BI_Bitmap *source, const RECT *sourceRect, uint8_t so
 void HandOnProfile(const BI_Bitmap *source, BI_Bitmap *destination) {
     if (source->profilePath == destination->profilePath) return;  // one bitmap, or neither has one
     platform::DestroyFilePath(destination->profilePath);
-    destination->profilePath =
-        source->profilePath != nullptr ? platform::CopyFilePath(*source->profilePath) : nullptr;
+    destination->profilePath = nullptr;
+    if (source->profilePath == nullptr) return;
+    AFilePath *copy = platform::CopyFilePath(*source->profilePath);
+    // A copy whose text could not get its memory comes out empty: that is a
+    // failed copy too.
+    const char *from = static_cast<const AString &>(*source->profilePath);
+    if (copy != nullptr && from[0] != '\0' && static_cast<const char *>(*copy)[0] == '\0') {
+        platform::DestroyFilePath(copy);
+        copy = nullptr;
+    }
+    destination->profilePath = copy;
 }
 
 void ReplaceProfile(BI_Bitmap *destination, const AFilePath *path) {
