@@ -24,16 +24,9 @@ struct CopyRows {
     BI_Bitmap *destination;
     int32_t width;
 
-    // Runs `row(sourceY, destinationY)` from the source rectangle's top to its
-    // bottom; a failed row ends the run with its status.
     template <class Row>
     int32_t Each(Row &&row) const {
-        int32_t dy = destinationRect.top;
-        for (int64_t sy = sourceRect.top; sy < sourceRect.bottom; ++sy, ++dy) {
-            const int32_t status = row(static_cast<int32_t>(sy), dy);
-            if (Failed(status)) return status;
-        }
-        return kOk;
+        return bm::EachCopyRow(sourceRect, destinationRect, row);
     }
 };
 

@@ -6,6 +6,8 @@
 
 #include <tessarine/bitmap.h>
 
+#include "core/status.h"
+
 namespace tessarine::bitmap {
 
 // Up to four zero-filled planes of `width` bytes, one block each, freed with
@@ -44,6 +46,19 @@ void HandOnProfile(const BI_Bitmap *source, BI_Bitmap *destination);
 // The destination's profile becomes a copy of `path`, or an empty path when
 // `path` is null.
 void ReplaceProfile(BI_Bitmap *destination, const AFilePath *path);
+
+// Runs `row(sourceY, destinationY)` from the source rectangle's top to its
+// bottom, the destination row going up by one from the destination
+// rectangle's top; a failed row ends the run with its status.
+template <class Row>
+int32_t EachCopyRow(const RECT &source, const RECT &destination, Row &&row) {
+    int32_t dy = destination.top;
+    for (int64_t sy = source.top; sy < source.bottom; ++sy, ++dy) {
+        const int32_t status = row(static_cast<int32_t>(sy), dy);
+        if (Failed(status)) return status;
+    }
+    return kOk;
+}
 
 // Pixels of a rectangle; false for a negative or overflowing extent.
 inline bool RectExtent(const RECT &r, int32_t *width) {

@@ -57,12 +57,7 @@ struct Job {
 
     template <class Row>
     int32_t EachRow(Row &&row) const {
-        int32_t dy = destinationRect.top;
-        for (int64_t sy = sourceRect.top; sy < sourceRect.bottom; ++sy, ++dy) {
-            const int32_t status = row(static_cast<int32_t>(sy), dy);
-            if (Failed(status)) return status;
-        }
-        return kOk;
+        return bm::EachCopyRow(sourceRect, destinationRect, row);
     }
 };
 

@@ -35,16 +35,6 @@ int32_t LevelBand::Allocate(int64_t stride, int64_t giveUpRows) {
     return kErrMemory;
 }
 
-LevelBlock::~LevelBlock() {
-    if (bytes_ != nullptr) MEM_FreePtr(bytes_);
-}
-
-bool LevelBlock::Allocate(int64_t bytes) {
-    if (bytes < 1 || bytes > UINT32_MAX) return false;
-    bytes_ = static_cast<uint8_t *>(MEM_AllocPtr(MEM_FLAG_ZERO, static_cast<uint32_t>(bytes)));
-    return bytes_ != nullptr;
-}
-
 int32_t SourceBands::Reach(int64_t y) {
     while (y >= bottom_) {
         top_ = bottom_;

@@ -32,21 +32,6 @@ class LevelBand {
     int64_t rows_ = 0;
 };
 
-// A zero-filled block of the library heap, freed with the object.
-class LevelBlock {
-  public:
-    LevelBlock() = default;
-    ~LevelBlock();
-    LevelBlock(const LevelBlock &) = delete;
-    LevelBlock &operator=(const LevelBlock &) = delete;
-    // False when the block cannot be had.
-    bool Allocate(int64_t bytes);
-    uint8_t *Bytes() const { return bytes_; }
-
-  private:
-    uint8_t *bytes_ = nullptr;
-};
-
 // Reads the source in consecutive whole-width bands of `rows` rows, from the
 // top, into `buffer` at `stride`.
 class SourceBands {

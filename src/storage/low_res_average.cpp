@@ -8,6 +8,7 @@
 #include <cstdint>
 #include <cstring>
 
+#include "core/block_guards.h"
 #include "core/status.h"
 #include "storage/low_res.h"
 
@@ -20,6 +21,12 @@ namespace {
 
 // The row-buffer record of the averaging has this many places.
 constexpr int32_t kMaxReduction = 100;
+
+// A zero-filled pointer block, or null when it cannot be had.
+uint8_t *ZeroBlock(int64_t bytes) {
+    if (bytes < 1 || bytes > UINT32_MAX) return nullptr;
+    return static_cast<uint8_t *>(MEM_AllocPtr(MEM_FLAG_ZERO, static_cast<uint32_t>(bytes)));
+}
 
 // Rows of averaged levels are padded to 4 bytes.
 int64_t AverageStride(int64_t d, int64_t width) { return ((d * width + 31) >> 3) & ~int64_t{3}; }
@@ -144,10 +151,13 @@ int32_t HVT_UpdateLowResAverage(HVT_FileInfo *info, uint8_t source, uint8_t dest
     const int32_t outW = static_cast<int32_t>(srcW / f);
     const int32_t outH = static_cast<int32_t>(srcH / f);
     const int64_t srcStride = AverageStride(d, srcW), dstStride = AverageStride(d, outW);
-    LevelBlock table, rowBuffers;
-    if (!table.Allocate(f * f * 255 + 1) || !rowBuffers.Allocate(f * (srcStride > 0 ? srcStride : 1)))
-        return kErrMemory;
-    FillAverageTable(f, table.Bytes());
+    uint8_t *table = ZeroBlock(f * f * 255 + 1);
+    const tessarine::FreeGuard tableGuard(table);
+    if (table == nullptr) return kErrMemory;
+    uint8_t *rowBuffers = ZeroBlock(f * (srcStride > 0 ? srcStride : 1));
+    const tessarine::FreeGuard rowBuffersGuard(rowBuffers);
+    if (rowBuffers == nullptr) return kErrMemory;
+    FillAverageTable(f, table);
     LevelBand in, out;
     status = in.Allocate(srcStride, f);
     if (!Failed(status)) status = out.Allocate(dstStride, 1);
@@ -171,12 +181,12 @@ int32_t HVT_UpdateLowResAverage(HVT_FileInfo *info, uint8_t source, uint8_t dest
             for (int64_t r = 0; r < f; ++r) {
                 s = bands.Reach(first + r);
                 if (Failed(s)) return s;
-                uint8_t *copy = rowBuffers.Bytes() + r * srcStride;
+                uint8_t *copy = rowBuffers + r * srcStride;
                 std::memcpy(copy, bands.Row(first + r), static_cast<size_t>(srcStride));
                 rows[r] = copy;
             }
         }
-        AverageRow(d, Block{rows, f}, table.Bytes(), outW, row);
+        AverageRow(d, Block{rows, f}, table, outW, row);
         return kOk;
     });
 }
