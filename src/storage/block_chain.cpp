@@ -56,12 +56,11 @@ TESSARINE_API int32_t FM_NewBlock(FM_BlockFile *file, FM_MemBlock **out) {
     FM_MemBlock *node = nullptr;
     int32_t status = FM_GetFreeMemBlock(file, &node);
     if (Failed(status)) return status;
-    // As with a fetch, a node that fails keeps its old index and dirty mark,
-    // so that no dirty node ever names a slot that cannot be written.
+    // The node takes its index before the read or seek that may fail, and
+    // keeps it then; only the marks of a new block wait for success.
     FM_BlockFileHdr &h = file->header;
-    uint32_t index = 0;
     if (h.freeHead != 0) {
-        index = h.freeHead;
+        node->index = h.freeHead;
         int32_t offset = 0;
         uint8_t bytes[4];
         status = SlotOffset(file, h.freeHead, kNextField, &offset);
@@ -69,15 +68,14 @@ TESSARINE_API int32_t FM_NewBlock(FM_BlockFile *file, FM_MemBlock **out) {
         if (Failed(status)) return status;
         h.freeHead = GetU32(bytes);
     } else {
-        index = h.nextIndex;
+        node->index = h.nextIndex;
         ++h.nextIndex;
         // The slot after the new block, counted without wrapping round.
-        const uint64_t after = (uint64_t(index) + 1) * h.stride;
+        const uint64_t after = (uint64_t(node->index) + 1) * h.stride;
         if (after > uint64_t(INT32_MAX)) return kErrFileAccess;
         status = FM_Seek(file->descriptor, 0, static_cast<int32_t>(after));
         if (Failed(status)) return status;
     }
-    node->index = index;
     node->dirty = 1;
     SetNodeWord(node, kNextField, 0);
     SetNodeWord(node, kPrevField, 0);
