@@ -10,26 +10,13 @@
 
 namespace tessarine::storage {
 
-namespace {
-// Steps beyond this many blocks make a walk check that the blocks exist.
-constexpr uint64_t kStepsBeforeBoundCheck = 64;
-}  // namespace
-
 int32_t NextAddr(FM_BlockFile *file, uint32_t block, uint32_t offset, uint32_t distance,
                  FM_BlockAddr *result, BlockObserver observer, void *context) {
     const uint32_t payload = file->header.payloadSize;
     result->block = block;
     result->offset = offset + distance;
-    uint64_t steps = 0;
-    uint64_t bound = UINT64_MAX;
+    CircleWatch watch(block);
     while (result->offset >= payload) {
-        // A chain in a circle would otherwise step as far as a hostile
-        // distance reaches: no walk passes more blocks than can exist.
-        if (++steps > kStepsBeforeBoundCheck && bound == UINT64_MAX) {
-            int32_t status = BlocksThatExist(file, &bound);
-            if (Failed(status)) return status;
-        }
-        if (steps > bound) return kErrFileAccess;
         result->offset -= payload;
         FM_BlockHdr header;
         int32_t status = FM_GetFileBlockHdrByIndex(file, result->block, &header);
@@ -38,6 +25,12 @@ int32_t NextAddr(FM_BlockFile *file, uint32_t block, uint32_t offset, uint32_t d
         if (observer != nullptr) {
             status = observer(context, result->block, result->offset);
             if (status != kOk) return status;
+        }
+        // Every chain closes on itself, so a long distance goes round it:
+        // whole turns end where they began and are skipped.
+        if (const uint64_t circle = watch.Step(result->block)) {
+            const uint64_t turns = result->offset / payload / circle;
+            result->offset -= static_cast<uint32_t>(turns * circle * payload);
         }
     }
     if (result->block == file->header.endBlock && result->offset >= file->header.endOffset)

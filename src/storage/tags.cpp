@@ -11,30 +11,6 @@ namespace {
 using namespace tessarine;
 using namespace tessarine::storage;
 
-// Bounds a walk from tag to tag: every tag has its own 8 bytes, and no walk
-// covers more bytes than the blocks that exist can hold.
-class StreamWalk {
-  public:
-    explicit StreamWalk(FM_BlockFile *file) : file_(file) {}
-    int32_t Pass(uint32_t length) {
-        if (length < FM_TAG_HDR_BYTES) return kErrFileAccess;
-        walked_ += length;
-        const uint64_t payload = file_->header.payloadSize;
-        if (walked_ > 64 * payload && bound_ == UINT64_MAX) {
-            uint64_t blocks = 0;
-            int32_t status = BlocksThatExist(file_, &blocks);
-            if (Failed(status)) return status;
-            bound_ = blocks * payload;
-        }
-        return walked_ > bound_ ? kErrFileAccess : kOk;
-    }
-
-  private:
-    FM_BlockFile *file_;
-    uint64_t walked_ = 0;
-    uint64_t bound_ = UINT64_MAX;
-};
-
 int32_t WriteTagHdr(FM_BlockFile *file, FM_BlockAddr at, const FM_TagHdr &header,
                     FM_BlockAddr *data) {
     uint8_t bytes[FM_TAG_HDR_BYTES];
@@ -149,12 +125,12 @@ TESSARINE_API int32_t FM_TagInsertHdrAt(FM_BlockFile *file, uint32_t block, uint
     if (Failed(status)) return status;
     uint32_t room = 0;
     if (found.kind == 0) {
-        StreamWalk walk(file);
+        // Free tags that lead back to one they passed would never end.
+        CircleWatch watch(AddrKey({block, offset}));
         for (;;) {
-            status = walk.Pass(found.length);
-            if (Failed(status)) return status;
             room += found.length;
             if (following.block == 0) break;
+            if (watch.Step(AddrKey(following)) != 0) return kErrFileAccess;
             FM_BlockAddr after;
             status =
                 FM_TagReadHdr(file, following.block, following.offset, &found, nullptr, &after);
@@ -252,19 +228,18 @@ TESSARINE_API int32_t FM_TagDelete(FM_BlockFile *file, const FM_BlockAddr *tag,
     if (Failed(status)) return status;
     uint32_t size = header.length;
 
-    StreamWalk walk(file);
-    status = walk.Pass(header.length);
-    while (!Failed(status) && following.block != 0) {
+    // Free tags that lead back to one they passed would never end.
+    CircleWatch watch(AddrKey(at));
+    while (following.block != 0) {
+        if (watch.Step(AddrKey(following)) != 0) return kErrFileAccess;
         FM_TagHdr found;
         FM_BlockAddr after;
         status = FM_TagReadHdr(file, following.block, following.offset, &found, nullptr, &after);
-        if (Failed(status) || found.kind != 0) break;
-        status = walk.Pass(found.length);
-        if (Failed(status)) break;
+        if (Failed(status)) return status;
+        if (found.kind != 0) break;
         size += found.length;
         following = after;
     }
-    if (Failed(status)) return status;
 
     if (following.block != 0) {
         // Blocks wholly inside the freed span leave the chain.

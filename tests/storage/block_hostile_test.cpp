@@ -90,15 +90,21 @@ TEST_F(BlockHostileTest, ZeroLengthTagIsRefusedByWalks) {
     EXPECT_EQ(StatusOf(Dup()), -50);
 }
 
-TEST_F(BlockHostileTest, LengthRunningPastTheFileGivesAStatus) {
+// Walks go round the one-block circle as far as the length reaches; only the
+// copy refuses a live tag longer than the file holds.
+TEST_F(BlockHostileTest, LengthRunningPastTheFile) {
     auto bytes = Header(P, S, 2, 1, 30);
     PutBlock(bytes, 1, 1, {{1, 0x7FFFFFF0u}});
     FM_BlockFile *f = Open(bytes);
     FM_TagHdr h{};
     FM_BlockAddr next{};
-    EXPECT_EQ(StatusOf(FM_TagReadHdr(f, 1, 0, &h, nullptr, &next)), -50);
+    EXPECT_EQ(StatusOf(FM_TagReadHdr(f, 1, 0, &h, nullptr, &next)), 10);
+    EXPECT_EQ(next, (FM_BlockAddr{0, 0x7FFFFFF0u % P}));  // at or past the end position
     FM_BlockAddr at = {1, 0};
-    EXPECT_EQ(StatusOf(FM_TagDelete(f, &at, nullptr)), -50);
+    EXPECT_EQ(StatusOf(FM_TagDelete(f, &at, &next)), 10);
+    EXPECT_EQ(next, (FM_BlockAddr{0, 0x7FFFFFF0u % P}));
+    EXPECT_EQ(f->header.endBlock, 0u);  // the only tag, at offset 0: its block is freed
+    EXPECT_EQ(f->header.freeHead, 1u);
     FM_BlockFileClose(&f);
     EXPECT_EQ(StatusOf(Dup()), -50);
 }
