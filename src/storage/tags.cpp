@@ -48,6 +48,9 @@ int32_t MoveTail(FM_BlockFile *file, uint32_t insertion, FM_BlockAddr from, uint
     if (Failed(status)) return status;
     if (file->tagCallback == nullptr) return kErrEmptyList;
     FM_BlockAddr at = from;
+    // A step may come back to a smaller offset of the block (round a ring);
+    // only a walk back to a tag it has passed would never leave it.
+    CircleWatch watch(AddrKey(at));
     while (at.block == insertion) {
         FM_BlockAddr before = at;
         FM_BlockAddr after = {target, at.offset};
@@ -57,8 +60,7 @@ int32_t MoveTail(FM_BlockFile *file, uint32_t insertion, FM_BlockAddr from, uint
         FM_BlockAddr next;
         status = FM_TagReadHdr(file, at.block, at.offset, &header, nullptr, &next);
         if (Failed(status)) return status;
-        // Within one block tags only go forward.
-        if (next.block == insertion && next.offset <= at.offset) return kErrFileAccess;
+        if (next.block == insertion && watch.Step(AddrKey(next)) != 0) return kErrFileAccess;
         at = next;
     }
     return kOk;
