@@ -5,6 +5,7 @@
 
 #include "core/status.h"
 #include "storage/block_file.h"
+#include "storage/tag_stream.h"
 
 namespace {
 
@@ -111,7 +112,7 @@ int32_t CopyLiveTags(FM_BlockFile *source, FM_BlockFile *destination, uint8_t *b
         FM_TagHdr header;
         status = FM_TagReadHdr(source, at.block, at.offset, &header, nullptr, nullptr);
         if (Failed(status)) return status;
-        if (header.kind != 0) {
+        if (header.kind != kFreeTag) {
             // A tag longer than the file can hold would make the copy grow
             // without end; one shorter than its header has a data count that
             // wraps round.
