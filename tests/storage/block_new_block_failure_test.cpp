@@ -46,6 +46,32 @@ class NewBlockFailureTest : public BlockFileFixture {
             ASSERT_EQ(StatusOf(FM_BlockWrite(file_, node->index, 0, P, data.data(), nullptr)), 10);
         }
     }
+    // A new block with the nth call of `kind` failing: -50, the caller's place
+    // untouched, and the recycled node (the head now) named `index` with the
+    // dirty mark and image of the block it held before.
+    void FailNewBlock(th::FileCall kind, int64_t n, const NodeView &evicted, uint32_t index) {
+        th::FailFileCallAt(kind, n);
+        FM_MemBlock *node = nullptr;
+        EXPECT_EQ(StatusOf(FM_NewBlock(file_, &node)), -50);
+        EXPECT_TRUE(th::FileFailureHit(kind));
+        th::ResetInjection();
+        EXPECT_EQ(node, nullptr);
+        const NodeView after = View(file_->cacheHead);
+        EXPECT_EQ(after.index, index);
+        EXPECT_EQ(after.dirty, evicted.dirty);
+        EXPECT_EQ(after.image, evicted.image);
+    }
+    // Closes the file, which must then be `slots` slots long with `image` in
+    // each of `where`; gives its bytes.
+    std::vector<uint8_t> CloseAndExpect(uint32_t slots, const std::vector<uint8_t> &image,
+                                        std::initializer_list<uint32_t> where) {
+        EXPECT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
+        std::vector<uint8_t> bytes = ReadAll(path_);
+        EXPECT_EQ(bytes.size(), size_t(slots) * S);
+        if (bytes.size() != size_t(slots) * S) return bytes;
+        for (uint32_t slot : where) EXPECT_EQ(Slot(bytes, slot), image) << slot;
+        return bytes;
+    }
 };
 
 // The free list runs 1, 2, 3, 4, 99 and slot 99 lies beyond the file: the
@@ -108,24 +134,11 @@ TEST_F(NewBlockFailureTest, InjectedFailureOfTheFreeLinkRead) {
         const NodeView evicted = View(Cached(file_, 5));
 
         // The eviction's write seeks first; the read's seek is the second.
-        th::FailFileCallAt(kind, kind == th::FileCall::Read ? 1 : 2);
-        FM_MemBlock *node = nullptr;
-        EXPECT_EQ(StatusOf(FM_NewBlock(file_, &node)), -50);
-        EXPECT_TRUE(th::FileFailureHit(kind));
-        th::ResetInjection();
-        EXPECT_EQ(node, nullptr);
+        FailNewBlock(kind, kind == th::FileCall::Read ? 1 : 2, evicted, 2);
         EXPECT_EQ(file_->header.freeHead, 2u);
         EXPECT_EQ(file_->header.nextIndex, 9u);
-        const NodeView after = View(file_->cacheHead);
-        EXPECT_EQ(after.index, 2u);
-        EXPECT_EQ(after.dirty, evicted.dirty);
-        EXPECT_EQ(after.image, evicted.image);
 
-        ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
-        const std::vector<uint8_t> bytes = ReadAll(path_);
-        ASSERT_EQ(bytes.size(), 9u * S);
-        EXPECT_EQ(Slot(bytes, 5), evicted.image);
-        EXPECT_EQ(Slot(bytes, 2), evicted.image);
+        const std::vector<uint8_t> bytes = CloseAndExpect(9, evicted.image, {5, 2});
         EXPECT_EQ(Le32(bytes, 24), 2u);
         ASSERT_EQ(StatusOf(FM_Delete(path_.c_str())), 10);
     }
@@ -137,23 +150,10 @@ TEST_F(NewBlockFailureTest, InjectedFailureOfTheSeekPastTheEnd) {
     Make(4, P);
     FillWithNewBlocks(0x60);  // blocks 1 to 4, all dirty
     const NodeView evicted = View(Cached(file_, 1));
-    th::FailFileCallAt(th::FileCall::Seek, 2);  // after the eviction's write
-    FM_MemBlock *node = nullptr;
-    EXPECT_EQ(StatusOf(FM_NewBlock(file_, &node)), -50);
-    EXPECT_TRUE(th::FileFailureHit(th::FileCall::Seek));
-    th::ResetInjection();
-    EXPECT_EQ(node, nullptr);
+    FailNewBlock(th::FileCall::Seek, 2, evicted, 5);  // the seek after the eviction's write
     EXPECT_EQ(file_->header.nextIndex, 6u);
-    const NodeView after = View(file_->cacheHead);
-    EXPECT_EQ(after.index, 5u);
-    EXPECT_EQ(after.dirty, evicted.dirty);
-    EXPECT_EQ(after.image, evicted.image);
 
-    ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
-    const std::vector<uint8_t> bytes = ReadAll(path_);
-    ASSERT_EQ(bytes.size(), 6u * S);
-    EXPECT_EQ(Slot(bytes, 1), evicted.image);
-    EXPECT_EQ(Slot(bytes, 5), evicted.image);
+    const std::vector<uint8_t> bytes = CloseAndExpect(6, evicted.image, {1, 5});
     EXPECT_EQ(Le32(bytes, 12), 6u);
 }
 
