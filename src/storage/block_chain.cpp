@@ -58,16 +58,23 @@ TESSARINE_API int32_t FM_NewBlock(FM_BlockFile *file, FM_MemBlock **out) {
         uint8_t bytes[4];
         status = SlotOffset(file, h.freeHead, kNextField, &offset);
         if (!Failed(status)) status = FM_SeekAndRead(file->descriptor, offset, 0, bytes, 4);
-        if (Failed(status)) return status;
-        h.freeHead = GetU32(bytes);
+        if (!Failed(status)) h.freeHead = GetU32(bytes);
     } else {
         node->index = h.nextIndex;
         ++h.nextIndex;
         // The slot after the new block, counted without wrapping round.
         const uint64_t after = (uint64_t(node->index) + 1) * h.stride;
-        if (after > uint64_t(INT32_MAX)) return kErrFileAccess;
-        status = FM_Seek(file->descriptor, 0, static_cast<int32_t>(after));
-        if (Failed(status)) return status;
+        status = after > uint64_t(INT32_MAX)
+                     ? kErrFileAccess
+                     : FM_Seek(file->descriptor, 0, static_cast<int32_t>(after));
+    }
+    if (Failed(status)) {
+        // A damaged header can name a slot that no file offset reaches: a
+        // dirty node there could never be written back, and would hold up
+        // the close and every later eviction.
+        int32_t offset = 0;
+        if (Failed(SlotOffset(file, node->index, 0, &offset))) node->dirty = 0;
+        return status;
     }
     node->dirty = 1;
     SetNodeWord(node, kNextField, 0);

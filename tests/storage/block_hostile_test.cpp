@@ -199,4 +199,19 @@ TEST_F(BlockHostileTest, HugeFreeHeadOrNextIndexGivesAStatus) {
     EXPECT_EQ(StatusOf(FM_BlockFileClose(&f)), 10);
 }
 
+// A dirty node recycled for a free head that no file offset reaches takes
+// that index but not the write-back: the close still succeeds and frees all.
+TEST_F(BlockHostileTest, RecycledDirtyNodeForAnUnreachableFreeHead) {
+    auto bytes = Header(P, S, 2, 1, 10);
+    PutBlock(bytes, 1, 1, {{1, 10}});
+    FM_BlockFile *f = Open(bytes);
+    FM_MemBlock *node = nullptr;
+    for (int i = 0; i < 5; ++i) ASSERT_EQ(StatusOf(FM_NewBlock(f, &node)), 10);
+    f->header.freeHead = 0x7FFFFFFF;
+    EXPECT_EQ(StatusOf(FM_NewBlock(f, &node)), -50);
+    EXPECT_EQ(f->cacheHead->index, 0x7FFFFFFFu);
+    EXPECT_EQ(f->cacheHead->dirty, 0u);
+    EXPECT_EQ(StatusOf(FM_BlockFileClose(&f)), 10);
+}
+
 }  // namespace
