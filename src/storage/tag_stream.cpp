@@ -9,6 +9,11 @@
 
 namespace tessarine::storage {
 
+namespace {
+// Frees beyond this many make the walk count the blocks there are.
+constexpr uint64_t kFreesBeforeCount = 64;
+}  // namespace
+
 int32_t WriteTagHdr(FM_BlockFile *file, FM_BlockAddr at, const FM_TagHdr &header,
                     FM_BlockAddr *data) {
     uint8_t bytes[FM_TAG_HDR_BYTES];
@@ -51,7 +56,17 @@ int32_t FreeBlocksBefore(FM_BlockFile *file, uint32_t from, uint32_t until, uint
     int32_t status = kOk;
     uint32_t block = NextOf(file, from, &status);
     if (Failed(status)) return status;
+    // A span of free space as long as a damaged stream can make it would have
+    // blocks freed again and again round a ring: no walk frees more blocks
+    // than there are.
+    uint64_t freed = 0;
+    uint64_t blocks = UINT64_MAX;
     while (*budget >= payload && block != until) {
+        if (++freed > kFreesBeforeCount && blocks == UINT64_MAX) {
+            status = BlocksThatExist(file, &blocks);
+            if (Failed(status)) return status;
+        }
+        if (freed > blocks) return kErrFileAccess;
         const uint32_t after = NextOf(file, block, &status);
         if (!Failed(status)) status = FM_FreeBlock(file, block);
         if (Failed(status)) return status;

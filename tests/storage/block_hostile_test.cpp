@@ -199,6 +199,19 @@ TEST_F(BlockHostileTest, HugeFreeHeadOrNextIndexGivesAStatus) {
     EXPECT_EQ(StatusOf(FM_BlockFileClose(&f)), 10);
 }
 
+// A free tag as long as a damaged file can make it, in a block that points at
+// itself and heads a free list that does too: the room it gives would have
+// the block freed again and again, tens of millions of times.
+TEST_F(BlockHostileTest, RoomThatWouldFreeOneBlockOverAndOver) {
+    auto bytes = Header(P, S, 2, 1, 10);
+    PutLe32(bytes, 24, 1);  // freeHead
+    PutBlock(bytes, 1, 1, {{0, 0x7FFFFFF0u}});
+    FM_BlockFile *f = Open(bytes);
+    FM_TagHdr t = Tag(1, 16);
+    EXPECT_EQ(StatusOf(FM_TagInsertHdrAt(f, 1, 0, &t, nullptr, nullptr, nullptr)), -50);
+    FM_BlockFileClose(&f);
+}
+
 // A dirty node recycled for a free head that no file offset reaches takes
 // that index but not the write-back: the close still succeeds and frees all.
 TEST_F(BlockHostileTest, RecycledDirtyNodeForAnUnreachableFreeHead) {
