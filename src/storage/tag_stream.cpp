@@ -9,11 +9,6 @@
 
 namespace tessarine::storage {
 
-namespace {
-// Frees beyond this many make the walk count the blocks there are.
-constexpr uint64_t kFreesBeforeCount = 64;
-}  // namespace
-
 int32_t WriteTagHdr(FM_BlockFile *file, FM_BlockAddr at, const FM_TagHdr &header,
                     FM_BlockAddr *data) {
     uint8_t bytes[FM_TAG_HDR_BYTES];
@@ -58,11 +53,12 @@ int32_t FreeBlocksBefore(FM_BlockFile *file, uint32_t from, uint32_t until, uint
     if (Failed(status)) return status;
     // A span of free space as long as a damaged stream can make it would have
     // blocks freed again and again round a ring: no walk frees more blocks
-    // than there are.
+    // than there were before it began (its own link writes can make the file
+    // longer).
     uint64_t freed = 0;
-    uint64_t blocks = UINT64_MAX;
+    uint64_t blocks = 0;
     while (*budget >= payload && block != until) {
-        if (++freed > kFreesBeforeCount && blocks == UINT64_MAX) {
+        if (freed++ == 0) {
             status = BlocksThatExist(file, &blocks);
             if (Failed(status)) return status;
         }
