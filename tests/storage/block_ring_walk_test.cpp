@@ -9,6 +9,7 @@
 
 #include "block_test_support.h"
 #include "core/status.h"
+#include "platform/test_hooks.h"
 #include "test_support.h"
 
 namespace {
@@ -144,6 +145,40 @@ TEST_F(RingWalkTest, StepOutOfTheFileFailsHalfWay) {
     FM_BlockAddr a{};
     EXPECT_EQ(StatusOf(FM_GetNextAddr(file_, 1, 0, 16 * 300, &a)), -50);
     EXPECT_EQ(a, (FM_BlockAddr{40, 16 * 300 - 4 * 16}));
+}
+
+// A read failing at any header fetch of a walk hundreds of steps round an
+// uncached ring: -50, with the result half-way where a walk one block at a
+// time stands when that step's fetch fails.
+TEST_F(RingWalkTest, ReadFailureAtEachFetchLeavesTheResultHalfWay) {
+    constexpr uint32_t P = 16, distance = 16 * 300 + 5;
+    Make(8, P);
+    FM_TagHdr t = Tag(1, P * 2 + 5);  // blocks 1, 3, 2
+    ASSERT_EQ(StatusOf(FM_TagAppendHdrAtEnd(file_, &t, nullptr, nullptr)), 10);
+    Reopen(8);
+    const std::vector<uint8_t> bytes = ReadAll(path_);
+    for (int64_t n = 1;; ++n) {
+        SCOPED_TRACE(n);
+        Reopen(8);
+        tessarine::testing::FailFileCallAt(tessarine::testing::FileCall::Read, n);
+        FM_BlockAddr a{};
+        const int32_t status = StatusOf(FM_GetNextAddr(file_, 1, 3, distance, &a));
+        const bool hit = tessarine::testing::FileFailureHit(tessarine::testing::FileCall::Read);
+        tessarine::testing::ResetInjection();
+        if (!hit) {
+            EXPECT_EQ(status, 10);
+            EXPECT_EQ(a, WalkBytes(bytes, 1, 3, distance).addr);
+            break;
+        }
+        ASSERT_EQ(status, -50);
+        // Step j subtracted its payload and then failed to fetch the block the
+        // walk stood on after j - 1 steps.
+        ASSERT_EQ((3 + distance - a.offset) % P, 0u);
+        const uint32_t j = (3 + distance - a.offset) / P;
+        ASSERT_GE(j, 1u);
+        EXPECT_EQ(a.block, WalkBytes(bytes, 1, 3, (j - 1) * P).addr.block);
+        ASSERT_LT(n, 100);
+    }
 }
 
 // Made by ordinary calls: a tag rewritten to 8 bytes in a block that points
