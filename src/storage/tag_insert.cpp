@@ -107,7 +107,7 @@ int32_t MakeRoom(FM_BlockFile *file, FM_BlockAddr *at, Room *room, uint32_t leng
         room->size += payload;
     }
     SetNodeWord(node, kFirstTagField, room->following.offset);
-    // Tags behind the position in its own block now lie before the new blocks.
+    // Tags behind the position in its block would sit in front of the new room.
     if (room->following.block == at->block) {
         status = CopyTail(file, at->block, room->following, lastAdded);
         if (!Failed(status))
