@@ -37,7 +37,11 @@ void CheckColumns(BI_Bitmap *b, const Layout &l, const char *route) {
             ASSERT_EQ(BI_GetGRow(b, y, 0, w, rows[3][y].data()), TS_OK);
         }
     }
-    const std::vector<int32_t> xs = {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, w - 1};
+    // Every bit place in memory; a few on a tile file, where every column
+    // read opens the file and takes a whole tile buffer.
+    const bool tiled = (b->storage & 1) == 0;
+    std::vector<int32_t> xs = {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, w - 1};
+    if (tiled) xs = {0, 5, w - 1};
     // A run of 4-byte pixels read as RGB takes 3 bytes a pixel from the run's
     // first byte: the pixel at x alone is the run that starts there.
     if (l.type == 4 && l.d == 32) {
@@ -47,8 +51,9 @@ void CheckColumns(BI_Bitmap *b, const Layout &l, const char *route) {
             }
         }
     }
-    const std::vector<std::pair<int32_t, int32_t>> spans = {
+    std::vector<std::pair<int32_t, int32_t>> spans = {
         {0, h}, {0, 1}, {h - 1, 1}, {1, h - 2}, {h / 3, h / 2}};
+    if (tiled) spans = {{0, h}, {h / 3, h / 2}};
     for (int32_t x : xs) {
         for (auto [y, n] : spans) {
             SCOPED_TRACE(testing::Message() << l.name << " " << route << " x " << x << " y " << y
