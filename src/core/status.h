@@ -83,34 +83,28 @@ namespace status_table {
 constexpr bool IsListed(const StatusText &row) {
     return row.status != kAnyOtherStatus && row.status != kNoStatus;
 }
+constexpr bool HasText(const StatusText &row) { return row.textId != kNoText; }
+constexpr int32_t StatusOfRow(const StatusText &row) { return row.status; }
+constexpr int32_t TextIdOfRow(const StatusText &row) { return row.textId; }
 
-constexpr int32_t LowestListed() {
-    int32_t low = 0;
-    for (const StatusText &row : kStatusTable)
-        if (IsListed(row) && row.status < low) low = row.status;
-    return low;
-}
-
-constexpr int32_t HighestListed() {
+struct Span {
+    int32_t low = INT32_MAX;
     int32_t high = INT32_MIN;
-    for (const StatusText &row : kStatusTable)
-        if (IsListed(row) && row.status > high) high = row.status;
-    return high;
+};
+
+// The least and greatest `value` of the rows that `keep` accepts.
+constexpr Span SpanOf(bool (*keep)(const StatusText &), int32_t (*value)(const StatusText &)) {
+    Span span;
+    for (const StatusText &row : kStatusTable) {
+        if (!keep(row)) continue;
+        if (value(row) < span.low) span.low = value(row);
+        if (value(row) > span.high) span.high = value(row);
+    }
+    return span;
 }
 
-constexpr int32_t FirstTextId() {
-    int32_t first = INT32_MAX;
-    for (const StatusText &row : kStatusTable)
-        if (row.textId != kNoText && row.textId < first) first = row.textId;
-    return first;
-}
-
-constexpr int32_t LastTextId() {
-    int32_t last = kNoText;
-    for (const StatusText &row : kStatusTable)
-        if (row.textId > last) last = row.textId;
-    return last;
-}
+inline constexpr Span kListed = SpanOf(IsListed, StatusOfRow);
+inline constexpr Span kTextIds = SpanOf(HasText, TextIdOfRow);
 
 constexpr int32_t GeneralTextId() {
     for (const StatusText &row : kStatusTable)
@@ -121,10 +115,9 @@ constexpr int32_t GeneralTextId() {
 // Every id between the bounds has exactly one row with a text, and every
 // listed status one row.
 constexpr bool IsWellFormed() {
-    for (int32_t id = FirstTextId(); id <= LastTextId(); ++id) {
+    for (int32_t id = kTextIds.low; id <= kTextIds.high; ++id) {
         int rows = 0;
-        for (const StatusText &row : kStatusTable)
-            if (row.textId == id) rows += row.text != nullptr ? 1 : 2;
+        for (const StatusText &row : kStatusTable) rows += row.textId == id;
         if (rows != 1) return false;
     }
     for (const StatusText &row : kStatusTable) {
@@ -142,11 +135,11 @@ constexpr bool IsWellFormed() {
 
 // The statuses looked up in the table; the rest show the general text, and
 // a status above 0 shows nothing.
-inline constexpr int32_t kLowestListedStatus = status_table::LowestListed();
-inline constexpr int32_t kHighestListedStatus = status_table::HighestListed();
+inline constexpr int32_t kLowestListedStatus = status_table::kListed.low;
+inline constexpr int32_t kHighestListedStatus = status_table::kListed.high;
 // The built-in string table's ids.
-inline constexpr int32_t kFirstTextId = status_table::FirstTextId();
-inline constexpr int32_t kLastTextId = status_table::LastTextId();
+inline constexpr int32_t kFirstTextId = status_table::kTextIds.low;
+inline constexpr int32_t kLastTextId = status_table::kTextIds.high;
 inline constexpr int32_t kGeneralTextId = status_table::GeneralTextId();
 
 static_assert(status_table::IsWellFormed(), "one row per status and per text id, ids without gaps");
