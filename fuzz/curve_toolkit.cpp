@@ -7,28 +7,11 @@
 
 #include <tessarine/curves.h>
 
+#include "double_reader.h"
+
 namespace {
 
-struct Reader {
-    const uint8_t *data;
-    size_t size;
-    double Next() {
-        double v = 0;
-        if (size >= sizeof v) {
-            std::memcpy(&v, data, sizeof v);
-            data += sizeof v;
-            size -= sizeof v;
-        }
-        return v;
-    }
-    uint8_t Byte() {
-        if (size == 0) return 0;
-        const uint8_t b = *data;
-        ++data;
-        --size;
-        return b;
-    }
-};
+using Reader = DoubleReader;
 
 void Curves(Reader &in) {
     double a[8], b[8];

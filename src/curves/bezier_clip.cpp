@@ -16,8 +16,8 @@ constexpr uint32_t kPairPoints = 10;
 constexpr uint32_t kStackStep = 200;
 // Beyond this the pairs have stopped separating (a tolerance below what
 // rounding allows, values that are not numbers): a status, not a hang.
-constexpr uint32_t kMostStackPoints = 131072;
-constexpr uint64_t kMostPairs = 262144;
+constexpr uint32_t kMostStackPoints = 16384;
+constexpr uint64_t kMostPairs = 131072;
 constexpr uint32_t kBigStack = 190;
 constexpr double kLeafGap = 0.001;
 constexpr double kSameResult = 0.0001;

@@ -155,7 +155,7 @@ TEST(CurveClipProperty, ASubCurveReportsKindFourWithItsRange) {
 TEST(CurveClipProperty, EveryCallEndsInBoundedTime) {
     std::mt19937_64 rng(19);
     const double tols[] = {0, -1, 1e-300, 1e-15, 1e300};
-    for (int i = 0; i < 20; ++i) {
+    for (int i = 0; i < 6; ++i) {
         const Cubic a = RandomCubic(rng, 10), b = RandomCubic(rng, 10);
         for (double tol : tols) {
             const auto t0 = std::chrono::steady_clock::now();

@@ -277,6 +277,15 @@ TEST(CurveCoincidence, DirectionAndTheNineTimesRule) {
     EXPECT_EQ(CurvesCoincide(c, 0, 1, bent2, 0, 1, tol, &way), 0);
 }
 
+TEST(CurveCoincidence, DistancesBelowTheToleranceOfDistanceAreZero) {
+    // 5e-9 apart everywhere, a tolerance of 1e-12: Distance makes every gap 0.
+    const BZ_Curve c{{0, 0}, {1, 2}, {3, 2}, {4, 0}};
+    const BZ_Curve d{{0, 5e-9}, {1, 2 + 5e-9}, {3, 2 + 5e-9}, {4, 5e-9}};
+    int32_t way = 7;
+    EXPECT_EQ(CurvesCoincide(c, 0, 1, d, 0, 1, 1e-12, &way), 1);
+    EXPECT_EQ(way, 1);
+}
+
 TEST(CurveCoincidence, WholeCurvesWriteTwoEntries) {
     const BZ_Curve c{{0, 0}, {1, 2}, {3, 2}, {4, 0}};
     const BZ_Curve r{{4, 0}, {3, 2}, {1, 2}, {0, 0}};
