@@ -130,6 +130,16 @@ TEST(CurveArcNodes, NonFiniteInputWritesNothing) {
             EXPECT_EQ(n.p[0].x, kSentinel);
         }
     }
+    Nodes endless;
+    ConvertArcToBezier(-2, 0, 0, 0, -1, endless.p, &endless.count);
+    EXPECT_EQ(endless.count, 0) << "a negative radius and sweep never pass the length test";
+    EXPECT_EQ(endless.p[0].x, kSentinel);
+    Nodes once;
+    ConvertArcToBezier(-2, 0, 0, 0, 3, once.p, &once.count);
+    EXPECT_EQ(once.count, 6) << "a negative radius with a sweep above a quarter stops at once";
+    Nodes small;
+    ConvertArcToBezier(-2, 0, 0, 0, 1, small.p, &small.count);
+    EXPECT_EQ(small.count, 0) << "below a quarter the rest is negative: endless again";
     Nodes huge;
     ConvertArcToBezier(1, 0, 0, 0, 1e300, huge.p, &huge.count);
     EXPECT_EQ(huge.count, 0) << "a sweep that whole turns cannot bring down";
