@@ -20,7 +20,7 @@ constexpr uint32_t kStackStep = 200;
 // stack peaks at a few hundred points, and nearly coincident curves 1e11
 // tolerances long take under a million pairs.
 constexpr uint32_t kMostStackPoints = 16384;
-constexpr uint64_t kMostPairs = 2097152;
+constexpr uint64_t kMostPairs = 1048576;
 // A piece this narrow is 50 quarterings deep, far below what the rounding
 // of any coordinate can tell apart; a run that needs to split it has lost
 // its way.
