@@ -84,10 +84,18 @@ double Seconds(std::chrono::steady_clock::time_point a, std::chrono::steady_cloc
     return std::chrono::duration<double>(b - a).count();
 }
 
+// The library calls a benchmark several times while it settles the number of
+// rounds; only the last, longest call's median stands.
 void RecordMedian(const std::string &what, std::vector<double> &ratios) {
     std::sort(ratios.begin(), ratios.end());
-    tsbench::RecordRatio(what + ", median of " + std::to_string(ratios.size()) + " rounds",
-                         ratios[ratios.size() / 2]);
+    const std::string name = what + ", median of rounds taken in turn";
+    for (tsbench::MeasuredRatio &r : tsbench::Measured()) {
+        if (r.name == name) {
+            r.ratio = ratios[ratios.size() / 2];
+            return;
+        }
+    }
+    tsbench::RecordRatio(name, ratios[ratios.size() / 2]);
 }
 
 const char *const kNames[4] = {"crossing", "disjoint", "touching", "coincident"};
