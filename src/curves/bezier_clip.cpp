@@ -37,8 +37,8 @@ class PairStack {
         if (points_ != nullptr) MEM_FreeHdl(points_);
     }
     int32_t Start() {
-        points_ = static_cast<BZ_Point *>(
-            MEM_AllocPtr(MEM_FLAG_ZERO, kStackStep * sizeof(BZ_Point)));
+        points_ =
+            static_cast<BZ_Point *>(MEM_AllocPtr(MEM_FLAG_ZERO, kStackStep * sizeof(BZ_Point)));
         if (points_ == nullptr) return kErrMemory;
         capacity_ = kStackStep;
         return kOk;
@@ -90,8 +90,7 @@ struct LocalResult {
 // All the state of one call.
 class ClipRun {
   public:
-    ClipRun(const BZ_Curve &a, const BZ_Curve &b, const ClipResult &out, double tol,
-            int16_t *kind)
+    ClipRun(const BZ_Curve &a, const BZ_Curve &b, const ClipResult &out, double tol, int16_t *kind)
         : wholeA_(a), wholeB_(b), out_(out), tol_(tol), kind_(kind) {}
     ~ClipRun() { FreeEntireList(&list_); }
 
@@ -130,10 +129,8 @@ int32_t ClipRun::CheckedPush(const ClipPiece &a, const ClipPiece &b) {
     return stack_.Push(a, b);
 }
 
-int32_t ClipRun::SplitA(const ClipPiece &a, const ClipFrame &fb, const ClipPiece &b,
-                        bool bFlat) {
-    if (a.t1 - a.t0 < kNarrowest || (!bFlat && b.t1 - b.t0 < kNarrowest))
-        return kErrStackOverflow;
+int32_t ClipRun::SplitA(const ClipPiece &a, const ClipFrame &fb, const ClipPiece &b, bool bFlat) {
+    if (a.t1 - a.t0 < kNarrowest || (!bFlat && b.t1 - b.t0 < kNarrowest)) return kErrStackOverflow;
     ClipPiece qa[4];
     SplitIntoQuarters(a, qa);
     bool touches[4];
@@ -194,10 +191,10 @@ int32_t ClipRun::Insert(const LocalResult *first, const LocalResult *second) {
 int32_t ClipRun::Leaf(const ClipPiece &a, const ClipPiece &b) {
     stop_ = false;
     int16_t k = 0;
-    const int32_t status = NewLineSegSegIntersect(
-        a.curve.p0.x, a.curve.p0.y, a.curve.p3.x, a.curve.p3.y, b.curve.p0.x, b.curve.p0.y,
-        b.curve.p3.x, b.curve.p3.y, a.t0, a.t1, b.t0, b.t1, 1, out_.tA, out_.tB, out_.pts,
-        out_.count, tol_, &k);
+    const int32_t status =
+        NewLineSegSegIntersect(a.curve.p0.x, a.curve.p0.y, a.curve.p3.x, a.curve.p3.y, b.curve.p0.x,
+                               b.curve.p0.y, b.curve.p3.x, b.curve.p3.y, a.t0, a.t1, b.t0, b.t1, 1,
+                               out_.tA, out_.tB, out_.pts, out_.count, tol_, &k);
     if (Failed(status)) return status;
     if (*kind_ == 0) *kind_ = k;
     if (k == 0) return kOk;
