@@ -21,6 +21,9 @@ constexpr uint32_t kStackStep = 200;
 // tolerances long take under a million pairs.
 constexpr uint32_t kMostStackPoints = 16384;
 constexpr uint64_t kMostPairs = 1048576;
+// Below a tolerance of 0 no frame is ever thin enough for a leaf: such a run
+// ends only where its pairs fall apart, which they do early or never.
+constexpr uint64_t kMostPairsWithoutLeaves = 65536;
 // A piece this narrow is 50 quarterings deep, far below what the rounding
 // of any coordinate can tell apart; a run that needs to split it has lost
 // its way.
@@ -256,9 +259,10 @@ int32_t ClipRun::Run(double *curveA, double *curveB) {
     if (Failed(status)) return status;
     status = stack_.Push(ClipPiece{wholeA_, 0.0, 1.0}, ClipPiece{wholeB_, 0.0, 1.0});
     if (Failed(status)) return status;
+    const uint64_t mostPairs = tol_ >= 0 ? kMostPairs : kMostPairsWithoutLeaves;
     uint64_t pairs = 0;
     while (!stack_.Empty()) {
-        if (++pairs > kMostPairs) return kErrStackOverflow;
+        if (++pairs > mostPairs) return kErrStackOverflow;
         ClipPiece a, b;
         stack_.Pop(&a, &b);
         // The caller's curves are the working storage of the pair in hand.
