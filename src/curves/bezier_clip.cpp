@@ -4,6 +4,7 @@
 // Pending pairs lie on a stack of our own, never in recursion.
 #include <cmath>
 #include <cstring>
+#include <initializer_list>
 
 #include "core/status.h"
 #include "curves/clip.h"
@@ -21,9 +22,25 @@ constexpr uint32_t kStackStep = 200;
 // tolerances long take under a million pairs.
 constexpr uint32_t kMostStackPoints = 16384;
 constexpr uint64_t kMostPairs = 1048576;
-// Below a tolerance of 0 no frame is ever thin enough for a leaf: such a run
-// ends only where its pairs fall apart, which they do early or never.
-constexpr uint64_t kMostPairsWithoutLeaves = 65536;
+// With a tolerance below what the coordinates' rounding can resolve (0 and
+// below included) only exactly straight pieces make a leaf: such a run ends
+// where its pairs fall apart, which they do early or never.
+constexpr uint64_t kMostPairsBelowRounding = 65536;
+constexpr double kRounding = 1e-15;
+
+// Whether frames can get thinner than tol: not at or below the rounding of
+// the largest coordinate, nor with values that are not numbers.
+bool Resolvable(const BZ_Curve &a, const BZ_Curve &b, double tol) {
+    const BZ_Point p[8] = {a.p0, a.p1, a.p2, a.p3, b.p0, b.p1, b.p2, b.p3};
+    double largest = 0.0;
+    for (const BZ_Point &q : p) {
+        for (double v : {q.x, q.y}) {
+            if (std::isnan(v)) return false;
+            if (std::fabs(v) > largest) largest = std::fabs(v);
+        }
+    }
+    return tol > 0 && tol > largest * kRounding;
+}
 // A piece this narrow is 50 quarterings deep, far below what the rounding
 // of any coordinate can tell apart; a run that needs to split it has lost
 // its way.
@@ -259,7 +276,8 @@ int32_t ClipRun::Run(double *curveA, double *curveB) {
     if (Failed(status)) return status;
     status = stack_.Push(ClipPiece{wholeA_, 0.0, 1.0}, ClipPiece{wholeB_, 0.0, 1.0});
     if (Failed(status)) return status;
-    const uint64_t mostPairs = tol_ >= 0 ? kMostPairs : kMostPairsWithoutLeaves;
+    const uint64_t mostPairs =
+        Resolvable(wholeA_, wholeB_, tol_) ? kMostPairs : kMostPairsBelowRounding;
     uint64_t pairs = 0;
     while (!stack_.Empty()) {
         if (++pairs > mostPairs) return kErrStackOverflow;
