@@ -175,15 +175,24 @@ int32_t MemoryToMemory(const Job &job) {
 int32_t MemoryToTile(const Job &job) {
     FileState file;
     // The masked route always asks for a descriptor of its own; it is closed
-    // again at the end, so that no descriptor outlives the call.
+    // again at the end, so that no descriptor outlives the call. The record
+    // it is begun from shows no descriptor, so that a failure before the
+    // file is opened cannot close the bitmap's own.
     const int32_t open = job.masked ? 1 : job.dst->tileFile == -1;
-    int32_t status = file.Begin(job.dst, open, open);
+    BI_Bitmap unopened;
+    const BI_Bitmap *from = job.dst;
+    if (job.masked && job.dst->tileFile != -1) {
+        unopened = *job.dst;
+        unopened.tileFile = -1;
+        from = &unopened;
+    }
+    int32_t status = file.Begin(from, open, open);
     if (Failed(status)) return status;
-    const MemoryPixels from(job.src);
+    const MemoryPixels pixels(job.src);
     HVT_FileInfo *info = file.Info();
     const RECT reach = Moved(OnImage(info, job.dstSub, job.dstRect), job.Dx(), job.Dy());
-    if (!Empty(reach) && !from.Holds(job.src, job.d, reach)) return kErrGeneral;
-    const bm::PixelArea source = from.Area(job.src);
+    if (!Empty(reach) && !pixels.Holds(job.src, job.d, reach)) return kErrGeneral;
+    const bm::PixelArea source = pixels.Area(job.src);
     return WalkTiles(info, job.dstSub, job.dstRect, job.d, false,
                      [&](int32_t i, const HVT_TileHdr &t, const RECT &I) {
                          const int32_t firstRow = I.top - t.top, rows = I.bottom - I.top;
