@@ -105,8 +105,10 @@ struct Job {
     }
     // The destination tile is read first unless the intersection replaces
     // whole tile rows; a masked move keeps unmasked pixels, so it always reads.
-    bool ReadsDestination(const RECT &I, const HVT_TileHdr &t) const {
-        return masked || I.left != t.left || I.right != t.right;
+    int32_t ReadDestinationTile(HVT_FileInfo *info, int32_t i, const HVT_TileHdr &t,
+                                const RECT &I) const {
+        if (!masked && I.left == t.left && I.right == t.right) return kOk;
+        return HVT_ReadTile(dstSub, info, i, I.top - t.top, I.bottom - I.top, info->tileBuffer);
     }
 };
 
@@ -196,11 +198,8 @@ int32_t MemoryToTile(const Job &job) {
     return WalkTiles(info, job.dstSub, job.dstRect, job.d, false,
                      [&](int32_t i, const HVT_TileHdr &t, const RECT &I) {
                          const int32_t firstRow = I.top - t.top, rows = I.bottom - I.top;
-                         if (job.ReadsDestination(I, t)) {
-                             const int32_t s = HVT_ReadTile(job.dstSub, info, i, firstRow, rows,
-                                                            info->tileBuffer);
-                             if (Failed(s)) return s;
-                         }
+                         const int32_t s0 = job.ReadDestinationTile(info, i, t, I);
+                         if (Failed(s0)) return s0;
                          const bm::PixelArea buffer{info->tileBuffer, TileStride(t, job.d),
                                                     file.TileBufferFence()};
                          const int32_t s = job.Move(source, Moved(I, job.Dx(), job.Dy()), buffer,
@@ -253,11 +252,8 @@ int32_t TileToTile(const Job &job) {
     return WalkTiles(out, job.dstSub, job.dstRect, job.d, job.masked,
                      [&](int32_t i, const HVT_TileHdr &t, const RECT &I) {
                          const int32_t firstRow = I.top - t.top, rows = I.bottom - I.top;
-                         if (job.ReadsDestination(I, t)) {
-                             const int32_t s = HVT_ReadTile(job.dstSub, out, i, firstRow, rows,
-                                                            out->tileBuffer);
-                             if (Failed(s)) return s;
-                         }
+                         const int32_t s0 = job.ReadDestinationTile(out, i, t, I);
+                         if (Failed(s0)) return s0;
                          const RECT from = Moved(I, job.Dx(), job.Dy());
                          // The block starts on the byte that holds the left edge.
                          // (A depth of 0 is refused by the pixel mover below.)
