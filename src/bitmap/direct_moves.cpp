@@ -241,6 +241,9 @@ int32_t TileToTile(const Job &job) {
     if (Failed(status)) return status;
     status = dstFile.Begin(job.dst, dstOpen, dstOpen);
     if (Failed(status)) return status;
+    // The block is laid out by the record's depth and filled by the file's:
+    // a record that disagrees with its file cannot take this route.
+    if (srcFile.Info()->header->bitsPerPixel != job.d) return kErrUnsupported;
     // One tile's rows with two bytes to spare for the row movers.
     const int64_t S = ((int64_t{ts::kTileWidth} * job.d + 7) >> 3) + 2;
     auto *block = static_cast<uint8_t *>(MEM_AllocPtr(0, static_cast<uint32_t>(S * ts::kTileHeight)));
@@ -260,10 +263,19 @@ int32_t TileToTile(const Job &job) {
                          const int32_t a = job.d == 0 ? from.left : static_cast<int32_t>(
                              ((int64_t{job.d} * from.left) & ~int64_t{7}) / job.d);
                          const HVT_Box box{a, from.top, from.right, from.bottom};
-                         int32_t s = HVT_ReadBlock(job.srcSub, in, &box, static_cast<int32_t>(S), block);
-                         if (Failed(s)) return s;
                          const bm::PixelArea buffer{out->tileBuffer, TileStride(t, job.d),
                                                     dstFile.TileBufferFence()};
+                         if (!job.masked && (job.d == 8 || job.d == 24 || job.d == 32)) {
+                             // Whole bytes land where the copy out of the block
+                             // would put them: read them there at once.
+                             uint8_t *at = out->tileBuffer + ((int64_t{I.left} - t.left) * job.d >> 3);
+                             const int32_t s = HVT_ReadBlock(job.srcSub, in, &box,
+                                                             static_cast<int32_t>(buffer.stride), at);
+                             if (Failed(s)) return s;
+                             return HVT_SaveTile(job.dstSub, out, i, firstRow, rows, out->tileBuffer);
+                         }
+                         int32_t s = HVT_ReadBlock(job.srcSub, in, &box, static_cast<int32_t>(S), block);
+                         if (Failed(s)) return s;
                          const RECT inBlock{from.left - a, 0, from.left - a + (I.right - I.left), rows};
                          s = job.Move(blockArea, inBlock, buffer, I.left - t.left, 0, I.left, I.top);
                          if (Failed(s)) return s;
