@@ -25,14 +25,25 @@ class DirectEdges : public tstest::Sandbox {
             if (b != nullptr) BI_DeleteBitmap(&b);
         tstest::Sandbox::TearDown();
     }
-    BI_Bitmap *Gray8(int32_t w, int32_t h, bool tiled, uint8_t fill) {
+    // Every byte of the pixels `fill`: 8-bit gray, or black and white.
+    BI_Bitmap *Filled(uint8_t type, uint8_t d, int32_t w, int32_t h, bool tiled, uint8_t fill) {
         BI_Bitmap *b = nullptr;
-        EXPECT_EQ(BI_CreateBlankBmp(2, 8, w, h, 300, 300, 1, 0, nullptr, &b, tiled ? 2 : 1, 0, 0, 0), TS_OK);
-        Bytes row(w, fill);
-        for (int32_t y = 0; y < h; ++y) EXPECT_EQ(BI_SetGRow(y, 0, w, row.data(), b), TS_OK);
+        EXPECT_EQ(BI_CreateBlankBmp(type, d, w, h, 300, 300, 1, 0, nullptr, &b, tiled ? 2 : 1, 0, 0, 0), TS_OK);
         made_.push_back(b);
+        if (!tiled) {
+            BI_FillByte(b, fill);
+            return b;
+        }
+        const Bytes row((int64_t{w} * d + 7) / 8, fill);
+        EXPECT_EQ(HVT_TileFileRowIOBegin(2, b, nullptr, 2, 0, 0), TS_OK);
+        for (int32_t y = 0; y < h; ++y)
+            EXPECT_EQ(d == 8 ? BI_SetGRow(y, 0, w, row.data(), b) : BI_SetBWPackedRow(y, 0, w, row.data(), b), TS_OK);
+        HVT_TileFileRowColIOEnd(b);
         return b;
     }
+    BI_Bitmap *Gray8(int32_t w, int32_t h, bool tiled, uint8_t fill) { return Filled(2, 8, w, h, tiled, fill); }
+    // The failure loops run many times: one bit a pixel keeps the buffers small.
+    BI_Bitmap *Bw(int32_t w, int32_t h, bool tiled, uint8_t fill) { return Filled(1, 1, w, h, tiled, fill); }
     BI_Bitmap *Made(BI_Bitmap *b) {
         made_.push_back(b);
         return b;
@@ -61,8 +72,8 @@ Traffic TileTraffic(const std::function<int32_t(const RECT &)> &run, const RECT 
 }
 
 TEST_F(DirectEdges, ARectangleInsideOneTileTouchesOneTileOnEveryRoute) {
-    BI_Bitmap *memS = Gray8(9000, 1100, false, 1), *memD = Gray8(9000, 1100, false, 2);
-    BI_Bitmap *tileS = Gray8(9000, 1100, true, 3), *tileD = Gray8(9000, 1100, true, 4);
+    BI_Bitmap *memS = Bw(9000, 1100, false, 1), *memD = Bw(9000, 1100, false, 2);
+    BI_Bitmap *tileS = Bw(9000, 1100, true, 3), *tileD = Bw(9000, 1100, true, 4);
     const RECT r{100, 100, 200, 150};
     auto copy = [&](BI_Bitmap *s, BI_Bitmap *d) {
         return [=](const RECT &x) { return BI_DirectCopyBmp(&x, s, &x, d, 0, 0); };
@@ -93,8 +104,8 @@ TEST_F(DirectEdges, ARectangleInsideOneTileTouchesOneTileOnEveryRoute) {
 }
 
 TEST_F(DirectEdges, ACrossingOfColumn8192WritesTwoTilesPerRowOfTiles) {
-    BI_Bitmap *memS = Gray8(9000, 1100, false, 1);
-    BI_Bitmap *tileS = Gray8(9000, 1100, true, 3), *tileD = Gray8(9000, 1100, true, 4);
+    BI_Bitmap *memS = Bw(9000, 1100, false, 1);
+    BI_Bitmap *tileS = Bw(9000, 1100, true, 3), *tileD = Bw(9000, 1100, true, 4);
     const RECT one{8000, 10, 8300, 20};     // one row of tiles
     const RECT two{8000, 1000, 8300, 1050};  // two rows of tiles
     auto copy = [&](BI_Bitmap *s) {
@@ -237,8 +248,8 @@ TEST_F(DirectEdges, AllocationFailuresOnEveryRoute) {
     const Bytes mask(64 * 16, 0xA5);
     for (int route = 0; route < 4; ++route)
         for (bool masked : {false, true}) {
-            BI_Bitmap *s = Gray8(8210, 1040, route & 2, 5);
-            BI_Bitmap *d = Gray8(8210, 1040, route & 1, 6);
+            BI_Bitmap *s = Bw(8210, 1040, route & 2, 0x5A);
+            BI_Bitmap *d = Bw(8210, 1040, route & 1, 0x0F);
             const int fds = tstest::OpenDescriptorCount();
             const int64_t n = tstest::ForEachAllocationFailure([&](int64_t) {
                 const int32_t st = masked ? BI_DirectMaskBmp(&r, s, 64, 3, 0, mask.data(), &r, d)
@@ -261,8 +272,8 @@ TEST_F(DirectEdges, FileFailuresOnEveryRoute) {
     for (FileCall kind : {FileCall::Read, FileCall::Write, FileCall::Seek})
         for (int route = 1; route < 4; ++route)
             for (bool masked : {false, true}) {
-                BI_Bitmap *s = Gray8(8210, 1040, route & 2, 5);
-                BI_Bitmap *d = Gray8(8210, 1040, route & 1, 6);
+                BI_Bitmap *s = Bw(8210, 1040, route & 2, 0x5A);
+                BI_Bitmap *d = Bw(8210, 1040, route & 1, 0x0F);
                 const int fds = tstest::OpenDescriptorCount();
                 const int64_t n = tstest::ForEachFileFailure(kind, [&](int64_t) {
                     const int32_t st = masked ? BI_DirectMaskBmp(&r, s, 64, 3, 0, mask.data(), &r, d)
