@@ -285,7 +285,9 @@ TEST_F(DirectEdges, FileFailuresOnEveryRoute) {
                     EXPECT_EQ(tstest::OpenDescriptorCount(), fds);
                 });
                 // Tile to memory writes nothing.
-                if (kind != FileCall::Write || route != 2) EXPECT_GT(n, 0) << "kind " << int(kind) << " route " << route << " masked " << masked;
+                if (kind != FileCall::Write || route != 2) {
+                    EXPECT_GT(n, 0) << "kind " << int(kind) << " route " << route << " masked " << masked;
+                }
             }
 }
 
