@@ -185,6 +185,25 @@ TEST_F(DirectEdges, IndexedRgbCopyReplacesTheColourTableAndLeavesTheIndexStale) 
     EXPECT_EQ(d->colorIndex, index);  // not rebuilt
 }
 
+TEST_F(DirectEdges, AColourTableThatCannotBeSetStopsTheCopy) {
+    const uint8_t a[6] = {1, 2, 3, 4, 5, 6}, b[9] = {9, 9, 9, 8, 8, 8, 7, 7, 7};
+    BI_Bitmap *s = nullptr, *d = nullptr;
+    ASSERT_EQ(BI_CreateBlankBmp(3, 8, 10, 10, 300, 300, 1, 2, a, &s, 1, 0, 0, 0), TS_OK);
+    ASSERT_EQ(BI_CreateBlankBmp(3, 8, 10, 10, 300, 300, 1, 3, b, &d, 2, 0, 0, 0), TS_OK);
+    Made(s);
+    Made(d);
+    const RECT r{0, 0, 10, 10};
+    // The table of another size needs a new block: that allocation fails.
+    th::FailAllocationAt(1);
+    EXPECT_EQ(TS_STATUS(BI_DirectCopyBmp(&r, s, &r, d, 0, 0)), -5);
+    EXPECT_TRUE(th::AllocationFailureHit());
+    th::ResetInjection();
+    EXPECT_EQ(d->colorCount, 3);
+    // A destination with no table cannot take one.
+    BI_Bitmap *gray = Gray8(10, 10, false, 0);
+    EXPECT_EQ(TS_STATUS(BI_DirectCopyBmp(&r, s, &r, gray, 0, 0)), -2);
+}
+
 TEST_F(DirectEdges, AnIndexedCmykSourceIsRefusedAndNothingMoves) {
     const uint8_t t[8] = {1, 2, 3, 4, 5, 6, 7, 8};
     BI_Bitmap *s = nullptr, *d = nullptr;
