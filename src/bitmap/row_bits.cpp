@@ -11,21 +11,31 @@ namespace tessarine::bitmap {
 namespace {
 
 #ifdef TESSARINE_SHUFFLE_PATH
-// 32 bytes a step: each byte's bits moved up by r and filled from the next
-// byte's top. Bytes have no shift of their own; the 16-bit shifts are masked.
+// 32 bytes: each byte's bits moved up by r and filled from the next byte's
+// top. Bytes have no shift of their own; the 16-bit shifts are masked.
+__attribute__((target("avx2"))) inline void ShiftStep(const uint8_t *in, uint8_t *out, __m128i up,
+                                                      __m128i down, __m256i keepUp,
+                                                      __m256i keepDown) {
+    const __m256i a = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(in));
+    const __m256i b = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(in + 1));
+    const __m256i v = _mm256_or_si256(_mm256_and_si256(_mm256_sll_epi16(a, up), keepUp),
+                                      _mm256_and_si256(_mm256_srl_epi16(b, down), keepDown));
+    _mm256_storeu_si256(reinterpret_cast<__m256i *>(out), v);
+}
+
 __attribute__((target("avx2"))) int64_t ShiftBytesLeftWide(const uint8_t *in, int64_t n, int r,
                                                            uint8_t *out) {
     const __m128i up = _mm_cvtsi32_si128(r), down = _mm_cvtsi32_si128(8 - r);
     const __m256i keepUp = _mm256_set1_epi8(static_cast<char>((0xFF << r) & 0xFF));
     const __m256i keepDown = _mm256_set1_epi8(static_cast<char>(0xFF >> (8 - r)));
     int64_t k = 0;
-    for (; k + 32 <= n; k += 32) {
-        const __m256i a = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(in + k));
-        const __m256i b = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(in + k + 1));
-        const __m256i v = _mm256_or_si256(_mm256_and_si256(_mm256_sll_epi16(a, up), keepUp),
-                                          _mm256_and_si256(_mm256_srl_epi16(b, down), keepDown));
-        _mm256_storeu_si256(reinterpret_cast<__m256i *>(out + k), v);
+    for (; k + 128 <= n; k += 128) {
+        ShiftStep(in + k, out + k, up, down, keepUp, keepDown);
+        ShiftStep(in + k + 32, out + k + 32, up, down, keepUp, keepDown);
+        ShiftStep(in + k + 64, out + k + 64, up, down, keepUp, keepDown);
+        ShiftStep(in + k + 96, out + k + 96, up, down, keepUp, keepDown);
     }
+    for (; k + 32 <= n; k += 32) ShiftStep(in + k, out + k, up, down, keepUp, keepDown);
     return k;
 }
 #endif
