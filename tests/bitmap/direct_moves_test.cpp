@@ -164,14 +164,32 @@ class DirectMoves : public tstest::Sandbox {
         const RECT win{(dr.left - 24) & ~7, dr.top - 3, std::min(kW, ((dr.right + 24) + 7) & ~7), std::min(kH, dr.bottom + 3)};
         Fill(&src, srcWin, 1000u + d);
         Fill(&dst, win, 2000u + d);
-        const int32_t status =
-            masked ? BI_DirectMaskBmp(&sr, src.b, static_cast<int32_t>(mask->stride), mask->x, mask->y,
-                                      mask->bytes.data(), &dr, dst.b)
-                   : BI_DirectCopyBmp(&sr, src.b, &dr, dst.b, srcSub, dstSub);
-        EXPECT_EQ(status, TS_OK);
+        auto run = [&](const RECT &s, const RECT &t) {
+            return masked ? BI_DirectMaskBmp(&s, src.b, static_cast<int32_t>(mask->stride), mask->x,
+                                             mask->y, mask->bytes.data(), &t, dst.b)
+                          : BI_DirectCopyBmp(&s, src.b, &t, dst.b, srcSub, dstSub);
+        };
+        // What opening the files costs: the same call on an empty rectangle.
+        const RECT none{sr.left, sr.top, sr.left, sr.top}, noneD{dr.left, dr.top, dr.left, dr.top};
+        tessarine::testing::ResetInjection();
+        EXPECT_EQ(run(none, noneD), TS_OK);
+        const int64_t baseReads = tessarine::testing::FileCallCount(FileCall::Read);
+        tessarine::testing::ResetInjection();
+        EXPECT_EQ(run(sr, dr), TS_OK);
+        const int64_t reads = tessarine::testing::FileCallCount(FileCall::Read) - baseReads;
+        const int64_t writes = tessarine::testing::FileCallCount(FileCall::Write);
+        tessarine::testing::ResetInjection();
         const dmodel::Call call{masked, d, sr, dr, mask};
         Img dstA = dst.img;
-        dmodel::Run(call, src.img, srcTiled, dstA, dstTiled, 0x00);
+        const dmodel::Counts n = dmodel::Run(call, src.img, srcTiled, dstA, dstTiled, 0x00);
+        // Each tile met is written once, and read once or not at all, as the
+        // route says. (Tile to tile also reads the source's table and blocks.)
+        EXPECT_EQ(writes, n.writes);
+        if (!(srcTiled && dstTiled)) {
+            EXPECT_EQ(reads, n.reads);
+        } else {
+            EXPECT_GE(reads, n.reads + n.blocks);
+        }
         dmodel::Run(call, src.img, srcTiled, dst.img, dstTiled, 0xFF);
         Img &dstB = dst.img;
         const Bytes got = ReadWindow(&dst, win);
@@ -224,8 +242,9 @@ void RunAllRoutes(DirectMoves *t, bool masked, int d) {
         // either: the model above is what they give.
         for (int route = 1; route < 4; ++route) {
             const bool alike = d >= 8 || (d == 1 && !masked && (route & 1));
-            if (alike)
+            if (alike) {
                 EXPECT_EQ(results[route], results[0]) << "route " << route << " d " << d << " sp " << p.sp << " dp " << p.dp;
+            }
         }
     }
 }
