@@ -130,7 +130,8 @@ int32_t WalkTiles(HVT_FileInfo *info, uint8_t sub, const RECT &R, int d, bool cl
     const int64_t total = across * slot.tilesDown;
     if (across <= 0 || total <= 0) return kOk;
     int64_t first = HVT_PixelInWhichTile(slot.tilesAcross, R.left, R.top);
-    int64_t last = HVT_PixelInWhichTile(slot.tilesAcross, R.right - 1, R.top);
+    const int32_t lastX = R.right == INT32_MIN ? INT32_MIN : R.right - 1;
+    int64_t last = HVT_PixelInWhichTile(slot.tilesAcross, lastX, R.top);
     if (clamped) {
         first = std::max<int64_t>(first, 0);
         last = std::min<int64_t>(last, total - 1);
