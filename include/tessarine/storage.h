@@ -103,10 +103,6 @@ typedef struct HVT_FileInfo {
     int32_t writeRowBytes;
     int32_t bandRowBytes;
     int32_t bandRows;
-    /* Library-private: the rows of readBox read from the file so far. A band
-       of a read-only session is read in slices as its rows are asked for. */
-    int32_t bandReadTop;
-    int32_t bandReadBottom;
 } HVT_FileInfo;
 
 TESSARINE_API int32_t HVT_CreateBlankTileBmpFile(uint8_t imageType, uint8_t bitsPerPixel,

@@ -133,53 +133,6 @@ HVT_Box BandOf(const HVT_FileInfo *s, int64_t y) {
                    std::min<int64_t>(start + rows, r.bottom));
 }
 
-// Rows of a band read in one go. A session that also writes reads its bands
-// whole: a write copied into the read band, or saved from the write band,
-// then never meets rows the file has not given yet.
-int64_t SliceRows(const HVT_FileInfo *s) {
-    const int64_t band = s->bandRows;
-    if (s->sessionFlags & 2) return band;
-    int64_t rows = ts::kMinSliceRows;
-    while (rows * 2 * s->bandRowBytes <= ts::kBandSliceBytes) rows *= 2;
-    return std::min(rows, band);
-}
-
-// Reads rows [top, bottom) of readBox into their place in readBuffer.
-int32_t ReadBandRows(HVT_FileInfo *s, int64_t top, int64_t bottom) {
-    const HVT_Box &rb = s->readBox;
-    const HVT_Box rows = MakeBox(rb.left, top, rb.right, bottom);
-    return HVT_ReadBlock(s->subIndex, s, &rows, s->bandRowBytes,
-                         s->readBuffer + (top - rb.top) * s->bandRowBytes);
-}
-
-// Makes sure row y of readBox is in readBuffer. The rows read so far stay one
-// run, [bandReadTop, bandReadBottom): the run grows to the slice holding y,
-// with the slices between, as if the band had been read whole.
-int32_t LoadBandRow(HVT_FileInfo *s, int64_t y) {
-    const HVT_Box &rb = s->readBox;
-    if (y >= s->bandReadTop && y < s->bandReadBottom) return kOk;
-    const int64_t slice = SliceRows(s);
-    const int64_t start = rb.top + (y - rb.top) / slice * slice;
-    const int64_t end = std::min<int64_t>(start + slice, rb.bottom);
-    int64_t top = s->bandReadTop, bottom = s->bandReadBottom;
-    int32_t status = kOk;
-    if (top == bottom) {
-        status = ReadBandRows(s, start, end);
-        top = start;
-        bottom = end;
-    } else if (y < top) {
-        status = ReadBandRows(s, start, top);
-        top = start;
-    } else {
-        status = ReadBandRows(s, bottom, end);
-        bottom = end;
-    }
-    if (Failed(status)) return status;
-    s->bandReadTop = static_cast<int32_t>(top);
-    s->bandReadBottom = static_cast<int32_t>(bottom);
-    return kOk;
-}
-
 bool Overlap(const HVT_Box &a, const HVT_Box &b) {
     return std::max(a.left, b.left) < std::min(a.right, b.right) &&
            std::max(a.top, b.top) < std::min(a.bottom, b.bottom);
@@ -231,13 +184,11 @@ int32_t ReadRowInSession(HVT_FileInfo *s, int64_t y, int64_t x, int64_t n,
             if (!(y >= rb.top && y < rb.bottom)) {
                 if (s->bandRows < 1) return kErrGeneral;
                 rb = BandOf(s, y);
-                s->bandReadTop = s->bandReadBottom = rb.top;
-            }
-            status = LoadBandRow(s, y);
-            if (Failed(status)) {
-                rb.top = rb.bottom = -1;
-                s->bandReadTop = s->bandReadBottom = -1;
-                return status;
+                status = HVT_ReadBlock(s->subIndex, s, &rb, s->bandRowBytes, buffer);
+                if (Failed(status)) {
+                    rb.top = rb.bottom = -1;
+                    return status;
+                }
             }
             offset = (y - rb.top) * s->bandRowBytes - ((rb.left * d) >> 3) + ((w.left * d) >> 3);
             break;

@@ -13,13 +13,6 @@ inline constexpr int32_t kDefaultBandBudget = 33554432;
 inline constexpr int32_t kMaxBandRows = 1024;
 // Buffer of a small-window session: 100 by 100 pixels of 3 bytes.
 inline constexpr int32_t kWindowBufferBytes = 30000;
-// A band of a read-only session is read from the file a slice at a time, as
-// its rows are asked for, so that a slice is still in the processor's caches
-// when its rows are used: slices of at most this many bytes, and of at least
-// kMinSliceRows rows.
-inline constexpr int64_t kBandSliceBytes = 1 << 20;
-inline constexpr int64_t kMinSliceRows = 4;
-
 // Something has been handed out for writing and not yet saved.
 bool HasPending(const HVT_FileInfo *session);
 // Saves the pending rows from the write buffer.
