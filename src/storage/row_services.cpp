@@ -207,7 +207,6 @@ int32_t WriteRowAlone(BI_Bitmap *b, int64_t y, int64_t x, int64_t n, int64_t nee
                       ts::RowAccess *a) {
     const int64_t d = b->bitsPerPixel;
     if (!RunInside(y, x, n, 0, 0, b->width, b->height)) return kErrGeneral;
-    if (n == 0) return kOk;
     auto *info = static_cast<HVT_FileInfo *>(MEM_AllocPtr(0, sizeof(HVT_FileInfo)));
     if (info == nullptr) return kErrMemory;
     HVT_InitFileInfo(info);
@@ -222,7 +221,7 @@ int32_t WriteRowAlone(BI_Bitmap *b, int64_t y, int64_t x, int64_t n, int64_t nee
     if (temp == nullptr) status = kErrMemory;
     // The edge bytes keep the pixels around the run: the row is read first
     // when the run does not fill them.
-    if (!Failed(status) && PartialEdges(d, x, n, b->width)) {
+    if (!Failed(status) && n > 0 && PartialEdges(d, x, n, b->width)) {
         const Span w = Widen(d, x, n, b->width);
         const HVT_Box box = MakeBox(w.left, y, w.right, y + 1);
         status = HVT_ReadBlock(0, info, &box, 0, temp);
@@ -254,7 +253,6 @@ int32_t WriteRowInSession(HVT_FileInfo *s, int64_t y, int64_t x, int64_t n, int6
     const HVT_Box &region = s->regionBox;
     if (!RunInside(y, x, n, region.left, region.top, region.right, region.bottom))
         return Refused(s);
-    if (n == 0) return kOk;
     const int64_t d = s->header->bitsPerPixel;
     const int64_t size = BlockSize(s->writeHandle);
     uint8_t *buffer = s->writeBuffer;
@@ -282,7 +280,10 @@ int32_t WriteRowInSession(HVT_FileInfo *s, int64_t y, int64_t x, int64_t n, int6
                 // go back whole: they are read first.
                 const bool widened = w.left != x || w.right != x + n;
                 if (d < 8 && (widened || PartialEdges(d, x, n, s->subbmps[s->subIndex].width))) {
-                    status = HVT_ReadBlock(s->subIndex, s, &wb, s->writeRowBytes, buffer);
+                    // A window of no rows (a count of 0) still hands out row y.
+                    HVT_Box window = wb;
+                    window.bottom = std::max(window.bottom, static_cast<int32_t>(y + 1));
+                    status = HVT_ReadBlock(s->subIndex, s, &window, s->writeRowBytes, buffer);
                     if (Failed(status)) {
                         wb.top = wb.bottom = pending.top = pending.bottom = -1;
                         return status;
