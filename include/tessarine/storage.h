@@ -125,7 +125,15 @@ TESSARINE_API int32_t HVT_ReadTile(uint8_t sub, HVT_FileInfo *info, int32_t tile
                                    int32_t rowCount, void *buffer);
 TESSARINE_API int32_t HVT_PixelInWhichTile(int32_t tilesAcross, int32_t x, int32_t y);
 
-/* ---- Tile block transfer ----------------------------------------------------- */
+/* ---- Tile block transfer -----------------------------------------------------
+   A box's rows go between the caller's buffer, stride bytes apart (0 for a
+   box of one row), and the sub-bitmap's tiles. The plain forms move whole
+   bytes. Below 8 bits per pixel the two bit-shift forms expect the box's
+   first pixel at different places of a buffer row:
+   - HVT_ReadBlockWithBitShift delivers it at the top bit of the row's first
+     byte, and finishes that byte from the tile data;
+   - HVT_SaveBlockWithBitShift takes it where it sits in a byte of a full
+     image row: at bit (left * bitsPerPixel) mod 8, counted from the top. */
 
 TESSARINE_API int32_t HVT_SaveBlock(uint8_t sub, HVT_FileInfo *info, const HVT_Box *box,
                                     int32_t stride, const void *buffer);
