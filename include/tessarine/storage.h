@@ -103,6 +103,9 @@ typedef struct HVT_FileInfo {
     int32_t writeRowBytes;
     int32_t bandRowBytes;
     int32_t bandRows;
+    /* Library-private: nonzero while tileBuffer has still to be given the
+       bytes the session's last band read leaves in it. */
+    uint8_t tileBufferOwed;
 } HVT_FileInfo;
 
 TESSARINE_API int32_t HVT_CreateBlankTileBmpFile(uint8_t imageType, uint8_t bitsPerPixel,

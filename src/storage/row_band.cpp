@@ -1,10 +1,11 @@
 // The band modes of a session: bands of bandRows rows, read whole on a miss
-// and written back as their pending rows when the band changes or the
-// session ends.
+// with one HVT_ReadBlock at the band's stride, and written back as their
+// pending rows when the band changes or the session ends.
 #include <tessarine/core.h>
 #include <tessarine/storage.h>
 
 #include "storage/row_access.h"
+#include "storage/tile_transfer.h"
 
 namespace tessarine::storage {
 namespace {
@@ -46,8 +47,7 @@ int32_t ReadBandRow(HVT_FileInfo *s, int64_t y, int64_t x, int64_t n, int64_t ne
     HVT_Box &rb = s->readBox;
     if (!InRows(y, rb)) {
         if (s->bandRows < 1) return kErrGeneral;
-        rb = BandOf(s, y);
-        const int32_t status = HVT_ReadBlock(s->subIndex, s, &rb, s->bandRowBytes, s->readBuffer);
+        const int32_t status = ReadSessionBand(s, BandOf(s, y));
         if (Failed(status)) {
             rb.top = rb.bottom = -1;
             return status;

@@ -9,6 +9,7 @@
 
 #include "storage/row_access.h"
 #include "storage/row_services.h"
+#include "storage/tile_transfer.h"
 
 namespace ts = tessarine::storage;
 using tessarine::Failed;
@@ -70,6 +71,7 @@ void CopyToReadBuffer(HVT_FileInfo *s, const HVT_Box &box, const uint8_t *row) {
     const int64_t at =
         (int64_t{box.top} - rb.top) * stride + ((box.left * d) >> 3) - ((rb.left * d) >> 3);
     if (at < 0 || at + bytes > ts::BlockSize(s->readHandle)) return;
+    ts::PayTileBuffer(s);  // the band's bytes as read, before they change
     std::memcpy(s->readBuffer + at, row, static_cast<size_t>(bytes));
 }
 

@@ -240,6 +240,7 @@ TESSARINE_API void HVT_TileFileEnd(HVT_FileInfo *info, int32_t closeFile) {
     FreeSessionHandle(info->readHandle, info->readBuffer);
     FreeSessionHandle(info->writeHandle, info->writeBuffer);
     FreeField(info->tileBuffer);
+    info->tileBufferOwed = 0;
 }
 
 }  // extern "C"

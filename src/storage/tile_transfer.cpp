@@ -12,6 +12,7 @@
 #include "storage/raw_file.h"
 #include "storage/tile_format.h"
 #include "storage/tile_walk.h"
+#include "storage/tile_transfer.h"
 
 namespace ts = tessarine::storage;
 using tessarine::Failed;
@@ -82,17 +83,19 @@ bool SavesStraight(const Transfer &x, const HVT_TileHdr &t, const HVT_Box &I, co
 // went straight, the bytes its last tiles would have left there are laid
 // down from the caller's rows: a later tile covers the start of the buffer,
 // an earlier one only what lies past that.
-template <class Straight>
-void SettleTileBuffer(const Transfer &x, const uint8_t *callerRows, Straight &&straight) {
+using StraightTest = bool (*)(const Transfer &, const HVT_TileHdr &, const HVT_Box &, const Span &);
+
+void SettleTileBuffer(const Transfer &x, const uint8_t *callerRows, StraightTest straight,
+                      int64_t from = 0) {
     uint8_t *const tileBuffer = x.info->tileBuffer;
-    int64_t covered = 0;
+    int64_t covered = from;
     (void)x.Walk().Backward([&](const HVT_TileHdr &t, const HVT_Box &I) {
         Span span;
         if (!RowsOf(t, x.d, I, &span)) return kErrFileAccess;
         const int64_t T = span.rowBytes;
         const int64_t extent = T * span.rows;
         if (extent <= covered) return kOk;
-        if (straight(t, I, span)) {
+        if (straight(x, t, I, span)) {
             const uint8_t *rows = callerRows + x.CallerOffset(I);
             for (int64_t at = covered; at < extent;) {
                 const int64_t r = at / T, c = at % T, n = std::min(T - c, extent - at);
@@ -105,10 +108,23 @@ void SettleTileBuffer(const Transfer &x, const uint8_t *callerRows, Straight &&s
     });
 }
 
-int32_t ReadBlockPlain(const Transfer &x, uint8_t *buffer) {
+// The bytes a walk leaves at the start of tileBuffer: its largest tile extent.
+int64_t WalkExtent(const Transfer &x) {
+    int64_t extent = 0;
+    (void)x.Walk().Forward([&](const HVT_TileHdr &t, const HVT_Box &I) {
+        extent = std::max(extent, ts::TileRowBytes(t, x.d) * (int64_t{I.bottom} - I.top));
+        return kOk;
+    });
+    return extent;
+}
+
+// Reads the box; *wentStraight tells whether some tile skipped tileBuffer,
+// which is then owed its bytes.
+int32_t ReadBlockPlainOwing(const Transfer &x, uint8_t *buffer, bool *wentStraightOut) {
     const int32_t fd = x.info->descriptor;
     uint8_t *const tileBuffer = x.info->tileBuffer;
-    bool wentStraight = false;
+    bool &wentStraight = *wentStraightOut;
+    wentStraight = false;
     const int32_t status = x.Walk().Forward([&](const HVT_TileHdr &t, const HVT_Box &I) {
         Span span;
         if (!RowsOf(t, x.d, I, &span)) return kErrFileAccess;
@@ -127,10 +143,13 @@ int32_t ReadBlockPlain(const Transfer &x, uint8_t *buffer) {
             std::memcpy(dst, src, static_cast<size_t>(n));
         return kOk;
     });
-    if (!Failed(status) && wentStraight)
-        SettleTileBuffer(x, buffer, [&](const HVT_TileHdr &t, const HVT_Box &I, const Span &span) {
-            return ReadsStraight(x, t, I, span);
-        });
+    return status;
+}
+
+int32_t ReadBlockPlain(const Transfer &x, uint8_t *buffer) {
+    bool wentStraight;
+    const int32_t status = ReadBlockPlainOwing(x, buffer, &wentStraight);
+    if (!Failed(status) && wentStraight) SettleTileBuffer(x, buffer, ReadsStraight);
     return status;
 }
 
@@ -158,10 +177,7 @@ int32_t SaveBlockPlain(const Transfer &x, const uint8_t *buffer) {
             std::memcpy(dst, src, static_cast<size_t>(n));
         return WriteRows(fd, span, tileBuffer);
     });
-    if (!Failed(status) && wentStraight)
-        SettleTileBuffer(x, buffer, [&](const HVT_TileHdr &t, const HVT_Box &I, const Span &span) {
-            return SavesStraight(x, t, I, span);
-        });
+    if (!Failed(status) && wentStraight) SettleTileBuffer(x, buffer, SavesStraight);
     return status;
 }
 
@@ -219,6 +235,10 @@ bool Serves(uint8_t sub, const HVT_FileInfo *info) {
     return sub < ts::kMaxSubbmps && info->header != nullptr;
 }
 
+Transfer SessionBand(HVT_FileInfo *s) {
+    return {s->subIndex, s, s->readBox, s->bandRowBytes, s->header->bitsPerPixel};
+}
+
 // The tile table, then the transfer's record; false with the status when
 // the table cannot be had.
 bool Prepare(uint8_t sub, HVT_FileInfo *info, const HVT_Box *box, int32_t stride, Transfer *x,
@@ -231,11 +251,40 @@ bool Prepare(uint8_t sub, HVT_FileInfo *info, const HVT_Box *box, int32_t stride
 
 }  // namespace
 
+namespace tessarine::storage {
+
+void PayTileBuffer(HVT_FileInfo *s) {
+    if (!s->tileBufferOwed) return;
+    s->tileBufferOwed = 0;
+    SettleTileBuffer(SessionBand(s), s->readBuffer, ReadsStraight);
+}
+
+int32_t ReadSessionBand(HVT_FileInfo *s, const HVT_Box &band) {
+    if (!Serves(s->subIndex, s)) return kErrArgument;
+    Transfer x;
+    int32_t status;
+    if (!Prepare(s->subIndex, s, &band, s->bandRowBytes, &x, &status)) return status;
+    // What the new band leaves covers the start of tileBuffer; the old band
+    // is still owed what lies past that, before readBuffer takes the new one.
+    if (s->tileBufferOwed) {
+        s->tileBufferOwed = 0;
+        SettleTileBuffer(SessionBand(s), s->readBuffer, ReadsStraight, WalkExtent(x));
+    }
+    s->readBox = band;
+    bool wentStraight;
+    status = ReadBlockPlainOwing(x, s->readBuffer, &wentStraight);
+    s->tileBufferOwed = !Failed(status) && wentStraight ? 1 : 0;
+    return status;
+}
+
+}  // namespace tessarine::storage
+
 extern "C" {
 
 TESSARINE_API int32_t HVT_ReadBlock(uint8_t sub, HVT_FileInfo *info, const HVT_Box *box,
                                     int32_t stride, void *buffer) {
     if (!Serves(sub, info)) return kErrArgument;
+    ts::PayTileBuffer(info);
     Transfer x;
     int32_t status;
     if (!Prepare(sub, info, box, stride, &x, &status)) return status;
@@ -245,6 +294,7 @@ TESSARINE_API int32_t HVT_ReadBlock(uint8_t sub, HVT_FileInfo *info, const HVT_B
 TESSARINE_API int32_t HVT_SaveBlock(uint8_t sub, HVT_FileInfo *info, const HVT_Box *box,
                                     int32_t stride, const void *buffer) {
     if (!Serves(sub, info)) return kErrArgument;
+    ts::PayTileBuffer(info);
     Transfer x;
     int32_t status;
     if (!Prepare(sub, info, box, stride, &x, &status)) return status;
@@ -254,6 +304,7 @@ TESSARINE_API int32_t HVT_SaveBlock(uint8_t sub, HVT_FileInfo *info, const HVT_B
 TESSARINE_API int32_t HVT_ReadBlockWithBitShift(uint8_t sub, HVT_FileInfo *info,
                                                 const HVT_Box *box, int32_t stride, void *buffer) {
     if (!Serves(sub, info)) return kErrArgument;
+    ts::PayTileBuffer(info);
     const int32_t d = info->header->bitsPerPixel;
     if (d >= 8 || (int64_t{box->left} * d) % 8 == 0)
         return HVT_ReadBlock(sub, info, box, stride, buffer);
@@ -267,6 +318,7 @@ TESSARINE_API int32_t HVT_SaveBlockWithBitShift(uint8_t sub, HVT_FileInfo *info,
                                                 const HVT_Box *box, int32_t stride,
                                                 const void *buffer) {
     if (!Serves(sub, info)) return kErrArgument;
+    ts::PayTileBuffer(info);
     const int32_t d = info->header->bitsPerPixel;
     const bool leftAligned = (int64_t{box->left} * d) % 8 == 0;
     const bool rightAligned = (int64_t{box->right} * d) % 8 == 0;

@@ -688,4 +688,55 @@ TEST_F(ShiftedRead, EveryPhaseAndShortSpanAgainstTheText) {
     }
 }
 
+// A band session's record serves the transfers too: its band reads go
+// straight into the band buffer, and tileBuffer still holds what their walks
+// leave in it when a shifted read looks, after bands of the same height and
+// after a shorter last band.
+TEST_F(ShiftedRead, AfterTheBandReadsOfASession) {
+    for (int32_t d : {1, 4}) {
+        const int32_t w = 8200, h = 40;
+        BI_Bitmap *b = nullptr;
+        ASSERT_EQ(BI_CreateBlankBmp(2, static_cast<uint8_t>(d), w, h, 300, 300, 1, 0, nullptr, &b, 2, 0, 0, 0),
+                  TS_OK);
+        Model m(w, h, d);
+        std::mt19937 rng(40 + d);
+        for (auto &v : m.bytes) v = static_cast<uint8_t>(rng());
+        {
+            HVT_FileInfo info;
+            HVT_InitFileInfo(&info);
+            ASSERT_EQ(HVT_TileFileBegin(b, &info, 0), TS_OK);
+            const HVT_Box all{0, 0, w, h};
+            ASSERT_EQ(HVT_SaveBlock(0, &info, &all, static_cast<int32_t>(m.rowBytes), m.bytes.data()), TS_OK);
+            HVT_TileFileEnd(&info, 0);
+        }
+        const int32_t bandRowBytes = w * d / 8 + 1;
+        ASSERT_EQ(HVT_TileFileRowIOBegin(1, b, nullptr, 2, 0, bandRowBytes * 16), TS_OK);
+        HVT_FileInfo *s = b->ioSession;
+        ASSERT_EQ(s->bandRows, 16);
+        TileBufferModel tb(b->tilePath, d);
+        std::memset(s->tileBuffer, 0, tb.bytes.size());
+        auto shifted = [&](const HVT_Box &box) {
+            BoxBuffer buf(box, d, rng);
+            const Expected e = ModelShiftRead(m, box, buf, tb, s, 0);
+            ASSERT_EQ(HVT_ReadBlockWithBitShift(0, s, &box, static_cast<int32_t>(buf.stride), buf.bytes.data()),
+                      TS_OK);
+            ExpectBuffer(e, buf, "shifted read on the session's record", box);
+        };
+        uint8_t v = 0;
+        ASSERT_EQ(BI_GetGRow(b, 3, 0, 1, &v), TS_OK);
+        tb.Walk(s, 0, {0, 0, w, 16}, d);
+        shifted({8189, 20, 8192, 22});
+        ASSERT_EQ(BI_GetGRow(b, 3, 0, 1, &v), TS_OK);   // a new band read
+        tb.Walk(s, 0, {0, 0, w, 16}, d);
+        ASSERT_EQ(BI_GetGRow(b, 20, 0, 1, &v), TS_OK);  // the same height
+        tb.Walk(s, 0, {0, 16, w, 32}, d);
+        ASSERT_EQ(BI_GetGRow(b, 35, 0, 1, &v), TS_OK);  // shorter: 8 rows
+        tb.Walk(s, 0, {0, 32, w, 40}, d);
+        shifted({8189, 0, 8192, 9});
+        shifted({8197, 1, 8199, 3});
+        HVT_TileFileRowColIOEnd(b);
+        BI_DeleteBitmap(&b);
+    }
+}
+
 }  // namespace
