@@ -197,6 +197,26 @@ TESSARINE_API int32_t Chkcv2arc(double x0, double y0, double x1, double y1, doub
                                 double *sweep, int16_t *isArc);
 TESSARINE_API int32_t BZ_MirrorPt(const BZ_Point *a, const BZ_Point *b, BZ_Point *point);
 
+/* ---- Polynomial solving and curve-line intersection ------------------------------ */
+
+/* Roots of a x x + b x + c; -7 (nothing written) when there is no real root. */
+TESSARINE_API int32_t FindRootDegree2(double a, double b, double c, double *first,
+                                      double *second);
+/* Roots of a cubic that lie in -T to 1 + T (T = tolerance / 100) come first in
+   roots (room for three); count says how many. Always 10; a must not be 0. */
+TESSARINE_API int32_t CL_Solv3orderEq(double a, double b, double c, double d, double tolerance,
+                                      double *roots, int16_t *count, int16_t *flag);
+/* A curve (eight values) against a line; arrays need room for 14 entries.
+   curveT gets the parameters on the curve, lineT those on the line. */
+TESSARINE_API int32_t CL_CvLnIntersection(double x0, double y0, double x1, double y1, double x2,
+                                          double y2, double x3, double y3, double lx0, double ly0,
+                                          double lx1, double ly1, double tolerance,
+                                          uint16_t *count, BZ_Point *points, double *curveT,
+                                          double *lineT, int16_t *kind);
+/* The parameter of p on the segment a-b; -1 when p is off it. */
+TESSARINE_API int32_t GetparONln(double ax, double ay, double bx, double by, double px, double py,
+                                 double tolerance, double *t);
+
 TESSARINE_END_C
 
 #endif
