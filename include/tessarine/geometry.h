@@ -224,7 +224,9 @@ TESSARINE_API int32_t VC_StrokeLnUniform(double step, double x0, double y0, doub
                                          int32_t *count, int16_t *onHeap, int32_t *capacity,
                                          BZ_Point *fixedPoints, double *fixedParams,
                                          BZ_Point **heapPoints, double **heapParams);
-/* Does not maintain capacity: a caller that reuses the heap arrays sets it. */
+/* Does not maintain capacity: a caller that reuses the heap arrays sets it.
+   With onHeap 0 on entry, arrays that are needed are made afresh and replace
+   the handles; free earlier ones first. */
 TESSARINE_API int32_t VC_SkArc(VC_StrokeSpec spec, BZ_Arc arc, int32_t *count, int16_t *onHeap,
                                int32_t *capacity, BZ_Point *fixedPoints, double *fixedParams,
                                BZ_Point **heapPoints, double **heapParams);
@@ -241,7 +243,9 @@ TESSARINE_API int32_t VC_StrokeBezierCurve(VC_StrokeSpec spec, double x0, double
                                            double y1, double x2, double y2, double x3, double y3,
                                            int32_t *count, BZ_Point **points, double **params);
 /* Parameters are tracked only when fixedParams is given and *heapParams is
-   not null on entry; otherwise every point has 0 and the last 1. */
+   not null on entry; otherwise every point has 0 and the last 1. The 257th
+   point makes new heap arrays that replace the handles (free earlier ones
+   first). */
 TESSARINE_API int32_t VC_SkBezierCurve(VC_StrokeSpec spec, double x0, double y0, double x1,
                                        double y1, double x2, double y2, double x3, double y3,
                                        int32_t *count, int16_t *onHeap, int32_t *capacity,

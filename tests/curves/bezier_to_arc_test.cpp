@@ -6,12 +6,14 @@
 #include <cstring>
 
 #include "core/status.h"
-#include "curve_test_util.h"
+#include "curve_fit_test_util.h"
 #include "test_support.h"
 
 using namespace gtest_curves;
 
 namespace {
+
+class BezierToArcTest : public CurveTest {};
 
 struct Fit {
     int32_t result = -1;
@@ -39,13 +41,13 @@ double ChainDeviation(const Fit &f, const Cubic &c) {
     double worst = 0;
     for (int i = 0; i < f.count; ++i)
         for (int k = 0; k <= 24; ++k)
-            worst = std::fmax(worst, DistanceToCurve(c, OnEntry(f.entries[i], k / 24.0)));
+            worst = std::fmax(worst, NearestOnCurve(c, OnEntry(f.entries[i], k / 24.0)));
     return worst;
 }
 
-const Cubic kQuarter{{1, 0, 1, kKappa, kKappa, 1, 0, 1}};
+const Cubic kQuarterCircle{{1, 0, 1, kKappa, kKappa, 1, 0, 1}};
 
-TEST(BezierToArc, StraightCubicWithHandlesOnTheChordGivesOneLine) {
+TEST_F(BezierToArcTest, StraightCubicWithHandlesOnTheChordGivesOneLine) {
     const Fit f = FitCurve(0.01, Cubic{{0, 0, 1, 1, 2, 2, 3, 3}});
     ASSERT_EQ(f.result, 1);
     ASSERT_EQ(f.count, 1);
@@ -57,7 +59,7 @@ TEST(BezierToArc, StraightCubicWithHandlesOnTheChordGivesOneLine) {
     EXPECT_EQ(f.entries[0].e, 0);
 }
 
-TEST(BezierToArc, HandlePointingBackwardsAlongTheChordGivesOneLine) {
+TEST_F(BezierToArcTest, HandlePointingBackwardsAlongTheChordGivesOneLine) {
     const Fit f = FitCurve(0.01, Cubic{{0, 0, -1, 0, 2, 0, 3, 0}});
     ASSERT_EQ(f.result, 1);
     ASSERT_EQ(f.count, 1);
@@ -66,8 +68,8 @@ TEST(BezierToArc, HandlePointingBackwardsAlongTheChordGivesOneLine) {
     EXPECT_EQ(f.entries[0].e, 0);
 }
 
-TEST(BezierToArc, QuarterCircleIsHalvedIntoTwoArcsThatDoNotMerge) {
-    const Fit f = FitCurve(0.001, kQuarter);
+TEST_F(BezierToArcTest, QuarterCircleIsHalvedIntoTwoArcsThatDoNotMerge) {
+    const Fit f = FitCurve(0.001, kQuarterCircle);
     ASSERT_EQ(f.result, 1);
     ASSERT_EQ(f.count, 2);
     double total = 0;
@@ -87,11 +89,11 @@ TEST(BezierToArc, QuarterCircleIsHalvedIntoTwoArcsThatDoNotMerge) {
         EXPECT_LT(e.d, kTurn);
         total += e.e;
     }
-    EXPECT_NEAR(total, kPi / 2, 1e-2);
-    EXPECT_LE(ChainDeviation(f, kQuarter), 1.5 * 0.001);
+    EXPECT_NEAR(total, kHalf / 2, 1e-2);
+    EXPECT_LE(ChainDeviation(f, kQuarterCircle), 1.5 * 0.001);
 }
 
-TEST(BezierToArc, ClockwiseArcKeepsAPositiveRadius) {
+TEST_F(BezierToArcTest, ClockwiseArcKeepsAPositiveRadius) {
     const Cubic cw{{0, 1, kKappa, 1, 1, kKappa, 1, 0}};
     const Fit f = FitCurve(0.001, cw);
     ASSERT_EQ(f.result, 1);
@@ -103,7 +105,7 @@ TEST(BezierToArc, ClockwiseArcKeepsAPositiveRadius) {
     }
 }
 
-TEST(BezierToArc, ClosedCurveWithEqualEndsIsOneZeroLengthLine) {
+TEST_F(BezierToArcTest, ClosedCurveWithEqualEndsIsOneZeroLengthLine) {
     // The handle height of a chord of no length is 0, and the straightness
     // limit is 0 as well: the algorithm appends one line before any halving.
     const Fit f = FitCurve(0.01, Cubic{{0, 0, 5, 5, -5, 5, 0, 0}});
@@ -115,7 +117,7 @@ TEST(BezierToArc, ClosedCurveWithEqualEndsIsOneZeroLengthLine) {
     EXPECT_EQ(f.entries[0].e, 0);
 }
 
-TEST(BezierToArc, NearlyClosedCurveIsHalvedAndFollowsTheCurve) {
+TEST_F(BezierToArcTest, NearlyClosedCurveIsHalvedAndFollowsTheCurve) {
     const Cubic loop{{0, 0, 5, 5, -5, 5, 1e-9, 0}};
     const Fit f = FitCurve(0.01, loop);
     ASSERT_EQ(f.result, 1);
@@ -123,7 +125,7 @@ TEST(BezierToArc, NearlyClosedCurveIsHalvedAndFollowsTheCurve) {
     EXPECT_LE(ChainDeviation(f, loop), 1.5 * 0.01);
 }
 
-TEST(BezierToArc, AllFourPointsEqualGiveAZeroLengthLine) {
+TEST_F(BezierToArcTest, AllFourPointsEqualGiveAZeroLengthLine) {
     const Fit f = FitCurve(0.01, Cubic{{2, 3, 2, 3, 2, 3, 2, 3}});
     EXPECT_EQ(f.result, 1);
     ASSERT_EQ(f.count, 1);
@@ -132,7 +134,7 @@ TEST(BezierToArc, AllFourPointsEqualGiveAZeroLengthLine) {
     EXPECT_EQ(f.entries[0].d, 3);
 }
 
-TEST(BezierToArc, SShapedCurveIsHalved) {
+TEST_F(BezierToArcTest, SShapedCurveIsHalved) {
     const Cubic s{{0, 0, 3, 4, -1, 4, 2, 0}};
     const Fit f = FitCurve(0.01, s);
     ASSERT_EQ(f.result, 1);
@@ -140,14 +142,14 @@ TEST(BezierToArc, SShapedCurveIsHalved) {
     EXPECT_LE(ChainDeviation(f, s), 1.5 * 0.01);
 }
 
-TEST(BezierToArc, ZeroToleranceRunsOutOfStackOrCountAndEndsWithZero) {
-    const Fit f = FitCurve(0, kQuarter);
+TEST_F(BezierToArcTest, ZeroToleranceRunsOutOfStackOrCountAndEndsWithZero) {
+    const Fit f = FitCurve(0, kQuarterCircle);
     EXPECT_EQ(f.result, 0);
     EXPECT_GE(f.count, 0);
     EXPECT_LE(f.count, 101);
 }
 
-TEST(BezierToArc, MoreThanAHundredElementsEndWithZeroAndKeepThem) {
+TEST_F(BezierToArcTest, MoreThanAHundredElementsEndWithZeroAndKeepThem) {
     // A long wavy curve at a fine tolerance: many elements, shallow halving.
     const Cubic wave{{0, 0, 3000, 9000, -2000, -9000, 1000, 0}};
     const Fit f = FitCurve(1e-6, wave);
@@ -156,7 +158,7 @@ TEST(BezierToArc, MoreThanAHundredElementsEndWithZeroAndKeepThem) {
     for (int i = 0; i < f.count; ++i) EXPECT_TRUE(f.entries[i].isArc == 0 || f.entries[i].isArc == 1);
 }
 
-TEST(BezierToArc, StackThatCannotBeAllocatedGivesZeroAndLeavesTheCount) {
+TEST_F(BezierToArcTest, StackThatCannotBeAllocatedGivesZeroAndLeavesTheCount) {
     tstest::ForEachAllocationFailure([](int64_t) {
         ArcFitEntry entries[101];
         int16_t count = 555;
@@ -170,7 +172,7 @@ TEST(BezierToArc, StackThatCannotBeAllocatedGivesZeroAndLeavesTheCount) {
     });
 }
 
-TEST(BezierToArc, EveryElementStaysNearTheCurve) {
+TEST_F(BezierToArcTest, EveryElementStaysNearTheCurve) {
     Random rnd(16);
     int checked = 0;
     for (int i = 0; i < 150; ++i) {

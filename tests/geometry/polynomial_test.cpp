@@ -5,8 +5,11 @@
 #include <cmath>
 #include <random>
 
+#include <tessarine/curves.h>
+
 #include "core/status.h"
 #include "geometry_test_util.h"
+#include "test_support.h"
 
 using namespace gtest_geometry;
 
@@ -190,6 +193,85 @@ TEST(GetparONln, ParameterJustBelowZeroIsClampedEvenWhenOffTheLine) {
     double t = kSentinel;
     EXPECT_EQ(GetparONln(0, 0, 1, 0, -0.00005, 5, 0.001, &t), -1);
     EXPECT_EQ(t, 0);
+}
+
+}  // namespace
+
+namespace {
+
+class CurveLineTest : public tstest::Sandbox {};
+
+TEST_F(CurveLineTest, CurveOfOnePointIsADot) {
+    uint16_t count = 99;
+    int16_t kind = kSentinel16;
+    BZ_Point pts[14];
+    double curveT[14], lineT[14];
+    EXPECT_EQ(CL_CvLnIntersection(1, 1, 1, 1, 1, 1, 1, 1, 0, 0, 2, 2, 1e-6, &count, pts, curveT,
+                                  lineT, &kind),
+              10);
+    EXPECT_EQ(count, 0);
+    EXPECT_EQ(kind, 2);
+}
+
+TEST_F(CurveLineTest, LineOfNoLengthIsADot) {
+    uint16_t count = 99;
+    int16_t kind = kSentinel16;
+    BZ_Point pts[14];
+    double curveT[14], lineT[14];
+    EXPECT_EQ(CL_CvLnIntersection(0, 0, 1, 2, 2, 2, 3, 0, 1, 1, 1, 1, 1e-6, &count, pts, curveT,
+                                  lineT, &kind),
+              10);
+    EXPECT_EQ(count, 0);
+    EXPECT_EQ(kind, 2);
+}
+
+TEST_F(CurveLineTest, CrossingGivesTheCurveParameterFirst) {
+    // A symmetric arch crossed by the vertical through its middle, on a line
+    // from (1.5, -1) to (1.5, 3): the crossing is at the curve's t = 0.5 and
+    // at the line's t = (1.5 + 1) / 4.
+    uint16_t count = 99;
+    int16_t kind = kSentinel16;
+    BZ_Point pts[14];
+    double curveT[14], lineT[14];
+    const int32_t r = CL_CvLnIntersection(0, 0, 0, 2, 3, 2, 3, 0, 1.5, -1, 1.5, 3, 1e-9, &count,
+                                          pts, curveT, lineT, &kind);
+    ASSERT_EQ(r, 10);
+    ASSERT_EQ(count, 1);
+    EXPECT_EQ(kind, 1);
+    EXPECT_NEAR(curveT[0], 0.5, 1e-6);
+    EXPECT_NEAR(lineT[0], 2.5 / 4, 1e-6);
+    EXPECT_NEAR(pts[0].x, 1.5, 1e-6);
+    EXPECT_NEAR(pts[0].y, 1.5, 1e-6);
+}
+
+TEST_F(CurveLineTest, NoCrossingGivesNoPoints) {
+    uint16_t count = 99;
+    int16_t kind = kSentinel16;
+    BZ_Point pts[14];
+    double curveT[14], lineT[14];
+    EXPECT_EQ(CL_CvLnIntersection(0, 0, 0, 2, 3, 2, 3, 0, 10, -1, 10, 3, 1e-9, &count, pts, curveT,
+                                  lineT, &kind),
+              10);
+    EXPECT_EQ(count, 0);
+    EXPECT_EQ(kind, 0);
+}
+
+TEST_F(CurveLineTest, AllocationFailureIsPassedUp) {
+    tstest::ForEachAllocationFailure([](int64_t) {
+        uint16_t count = 0;
+        int16_t kind = 0;
+        BZ_Point pts[14];
+        pts[0] = SentinelPoint();
+        double curveT[14], lineT[14];
+        const int32_t r = CL_CvLnIntersection(0, 0, 0, 2, 3, 2, 3, 0, 1.5, -1, 1.5, 3, 1e-9,
+                                              &count, pts, curveT, lineT, &kind);
+        if (tessarine::testing::AllocationFailureHit()) {
+            EXPECT_EQ(r, -5);
+            ExpectSentinel(pts[0]);
+        } else {
+            EXPECT_EQ(r, 10);
+        }
+    });
 }
 
 }  // namespace
