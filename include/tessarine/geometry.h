@@ -197,6 +197,48 @@ TESSARINE_API int32_t Chkcv2arc(double x0, double y0, double x1, double y1, doub
                                 double *sweep, int16_t *isArc);
 TESSARINE_API int32_t BZ_MirrorPt(const BZ_Point *a, const BZ_Point *b, BZ_Point *point);
 
+/* ---- Boxes and box tests -------------------------------------------------------------
+   Outcode bits: 1 x below xmin, 2 x above xmax, 4 y below ymin, 8 y above
+   ymax; a point on an edge is inside. Relation codes of the bare-box tests:
+   0 no contact found, 4 both ends outside and crossing, 5 start inside,
+   6 end inside, 7 both inside. */
+
+/* Copies the two points as they are; does not order them. */
+TESSARINE_API void AssigXQ2DBox(double x0, double y0, double x1, double y1, BZ_Point *first,
+                                BZ_Point *second);
+TESSARINE_API int32_t FindLineMinmaxBox(double x0, double y0, double x1, double y1, BZ_Point *min,
+                                        BZ_Point *max);
+/* The exact box of the curve, not of its control points. */
+TESSARINE_API int32_t BZ_FindCurveMinmaxBox(double x0, double y0, double x1, double y1,
+                                            double x2, double y2, double x3, double y3,
+                                            BZ_Point *min, BZ_Point *max);
+TESSARINE_API int32_t BZ_FindArcMinmaxBox(BZ_Arc arc, BZ_Point *min, BZ_Point *max);
+/* 1 when the point lies in the box grown by the tolerance, edges included. */
+TESSARINE_API int32_t BZ_IsPtInBBox(const BZ_Point *point, const BZ_Point *min,
+                                    const BZ_Point *max, double tolerance);
+TESSARINE_API double BZ_Mindistsqpt2BBox(double px, double py, double xmin, double ymin,
+                                         double xmax, double ymax);
+TESSARINE_API double BZ_Maxdistsqpt2BBox(double px, double py, double xmin, double ymin,
+                                         double xmax, double ymax);
+TESSARINE_API int16_t GetOutCode(double xmin, double ymin, double xmax, double ymax, double px,
+                                 double py);
+TESSARINE_API int16_t BZ_LNboxintersected(double xmin, double ymin, double xmax, double ymax,
+                                          double x0, double y0, double x1, double y1);
+TESSARINE_API int16_t BZ_CVboxintersected(double xmin, double ymin, double xmax, double ymax,
+                                          const BZ_Curve *curve);
+/* 1 for contact, 0 for none. */
+TESSARINE_API int32_t BZ_ARCboxintersected(double xmin, double ymin, double xmax, double ymax,
+                                           double centreX, double centreY, double radius,
+                                           double startAngle, double sweep);
+/* 1 for contact with the box grown by the tolerance, 0 for none. */
+TESSARINE_API int32_t BZ_LineBBoxInt(const BZ_Point *p0, const BZ_Point *p1, const BZ_Point *min,
+                                     const BZ_Point *max, double tolerance);
+/* 10, or -56 (result 0) when the halving passes 64 pending pieces; result
+   is 1 for contact with the box grown by the tolerance, 0 for none. */
+TESSARINE_API int32_t BZ_CurveBBoxInt(double x0, double y0, double x1, double y1, double x2,
+                                      double y2, double x3, double y3, const BZ_Point *min,
+                                      const BZ_Point *max, double tolerance, int32_t *result);
+
 /* ---- Stroking ----------------------------------------------------------------------
    A stroke is a polyline of points on the segment, each optionally with its
    parameter (0 at the start, 1 at the end).
