@@ -14,10 +14,17 @@ namespace {
 
 constexpr uint32_t kPairPoints = 10;
 constexpr uint32_t kStackStep = 200;
-// Beyond this the pairs have stopped separating (a tolerance below what
-// rounding allows, values that are not numbers): a status, not a hang.
-constexpr uint32_t kMostStackPoints = 131072;
-constexpr uint64_t kMostPairs = 2000000;
+// Beyond these the pairs have stopped separating (a tolerance at or below
+// what rounding allows, values that are not numbers): a status, not a hang.
+// Runs on finite curves with a workable tolerance stay far below them: the
+// stack peaks at a few hundred points, and nearly coincident curves 1e11
+// tolerances long take under a million pairs.
+constexpr uint32_t kMostStackPoints = 16384;
+constexpr uint64_t kMostPairs = 1048576;
+// A piece this narrow is 50 quarterings deep, far below what the rounding
+// of any coordinate can tell apart; a run that needs to split it has lost
+// its way.
+constexpr double kNarrowest = 1e-30;
 constexpr uint32_t kBigStack = 190;
 constexpr double kLeafGap = 0.001;
 constexpr double kSameResult = 0.0001;
@@ -125,6 +132,8 @@ int32_t ClipRun::CheckedPush(const ClipPiece &a, const ClipPiece &b) {
 
 int32_t ClipRun::SplitA(const ClipPiece &a, const ClipFrame &fb, const ClipPiece &b,
                         bool bFlat) {
+    if (a.t1 - a.t0 < kNarrowest || (!bFlat && b.t1 - b.t0 < kNarrowest))
+        return kErrStackOverflow;
     ClipPiece qa[4];
     SplitIntoQuarters(a, qa);
     bool touches[4];
@@ -152,6 +161,7 @@ int32_t ClipRun::SplitA(const ClipPiece &a, const ClipFrame &fb, const ClipPiece
 }
 
 int32_t ClipRun::SplitB(const ClipPiece &a, const ClipFrame &fa, const ClipPiece &b) {
+    if (b.t1 - b.t0 < kNarrowest) return kErrStackOverflow;
     ClipPiece qb[4];
     SplitIntoQuarters(b, qb);
     for (int j = 0; j < 4; ++j) {

@@ -9,8 +9,10 @@ namespace {
 
 struct Sextic {
     double c6, c5, c4, c3, c2, c1, c0;
-    double F(double t) const { return (((((c6 * t + c5) * t + c4) * t + c3) * t + c2) * t + c1) * t + c0; }
-    // Half the derivative's worth of work: g = f', g' = f''.
+    double F(double t) const {
+        return (((((c6 * t + c5) * t + c4) * t + c3) * t + c2) * t + c1) * t + c0;
+    }
+    // g = f' and g' = f''.
     double G(double t) const {
         return ((((6 * c6 * t + 5 * c5) * t + 4 * c4) * t + 3 * c3) * t + 2 * c2) * t + c1;
     }
@@ -21,17 +23,16 @@ struct Sextic {
 
 double Dot(BZ_Point u, BZ_Point v) { return u.x * v.x + u.y * v.y; }
 
-// Lowest sample of S[1..7] against S[0], the earliest of equal ones.
+}  // namespace
+
+namespace tessarine::curves {
+
 int LowestSample(const double S[9]) {
     int m = 0;
     for (int i = 1; i <= 7; ++i)
         if (S[i] < S[m]) m = i;
     return m;
 }
-
-}  // namespace
-
-namespace tessarine::curves {
 
 int32_t NearestOnCubic(const BZ_CurveCoef &k, double px, double py, double *dist, double *t,
                        double *x, double *y, double limit, double eps) {

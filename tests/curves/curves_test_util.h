@@ -81,3 +81,28 @@ inline double DistanceToCurve(const Cubic &c, BZ_Point p) {
 class CurveTest : public tstest::Sandbox {};
 
 }  // namespace gtest_curves
+
+namespace gtest_curves {
+
+// The result arrays of a curve pair, pre-filled with sentinels.
+struct Hits {
+    double tA[14], tB[14];
+    BZ_Point pts[14];
+    uint16_t count = 999;
+    int16_t kind = kSentinel16;
+    int32_t status = 0;
+    Hits() {
+        for (int i = 0; i < 14; ++i) {
+            tA[i] = tB[i] = kSentinel;
+            pts[i] = Pt(kSentinel, kSentinel);
+        }
+    }
+};
+
+inline Hits CurvePair(const Cubic &a, const Cubic &b, double tol) {
+    Hits h;
+    h.status = NewCurveCurveIntersect(a.v, b.v, h.tA, h.tB, h.pts, &h.count, tol, &h.kind);
+    return h;
+}
+
+}  // namespace gtest_curves
