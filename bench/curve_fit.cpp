@@ -33,22 +33,7 @@ std::vector<Curve> MakeCurves(uint64_t seed, int n, double extent) {
     return curves;
 }
 
-double Seconds(std::chrono::steady_clock::time_point a, std::chrono::steady_clock::time_point b) {
-    return std::chrono::duration<double>(b - a).count();
-}
-
-// Only the last, longest call's median stands.
-void RecordMedian(const std::string &what, std::vector<double> &ratios, double target = 0) {
-    std::sort(ratios.begin(), ratios.end());
-    const std::string name = what + ", median of rounds taken in turn";
-    for (tsbench::MeasuredRatio &r : tsbench::Measured()) {
-        if (r.name == name) {
-            r.ratio = ratios[ratios.size() / 2];
-            return;
-        }
-    }
-    tsbench::RecordRatio(name, ratios[ratios.size() / 2], target);
-}
+using tsbench::Seconds;
 
 class Cairo {
   public:
@@ -115,7 +100,7 @@ void BM_StrokeVsCairo(benchmark::State &state) {
     std::snprintf(what, sizeof what,
                   "VC_StrokeBezierCurve vs cairo_copy_path_flat at tolerance %g (points %lld vs %lld)",
                   tolerance, static_cast<long long>(ours), static_cast<long long>(theirs));
-    RecordMedian(what, ratios, 1.0);
+    tsbench::RecordMedianOfRounds(what, ratios, 1.0);
 }
 
 void Sample(const Curve &c) {
@@ -162,7 +147,7 @@ void BM_BezierToArc(benchmark::State &state) {
     char what[160];
     std::snprintf(what, sizeof what,
                   "BezierToArc curves at tolerance %g vs sampling each at 64 points", tolerance);
-    RecordMedian(what, ratios);
+    tsbench::RecordMedianOfRounds(what, ratios);
 }
 
 BENCHMARK(BM_StrokeVsCairo)->Arg(100)->Arg(250)->Arg(1000)->UseManualTime();

@@ -5,6 +5,7 @@
 #include <cmath>
 
 #include "core/status.h"
+#include "curves/split.h"
 
 using namespace tessarine;
 
@@ -27,20 +28,11 @@ struct Rect {
     }
 };
 
-void Split(const BZ_Curve &c, double t, BZ_Curve *left, BZ_Curve *right) {
-    left->p0 = c.p0;
-    right->p3 = c.p3;
-    SubDivideBezier(c.p0.x, c.p0.y, c.p1.x, c.p1.y, c.p2.x, c.p2.y, c.p3.x, c.p3.y, t,
-                    &left->p1.x, &left->p1.y, &right->p2.x, &right->p2.y, &left->p2.x,
-                    &left->p2.y, &left->p3.x, &left->p3.y, &right->p1.x, &right->p1.y);
-    right->p0 = left->p3;
-}
-
 // A piece is judged by its point at parameter 0.5.
 bool MiddleInside(const BZ_Curve &c, const Rect &r) {
     BZ_Curve left;
     BZ_Curve right;
-    Split(c, 0.5, &left, &right);
+    tessarine::curves::SplitCurveAt(c, 0.5, &left, &right);
     return r.Holds(left.p3);
 }
 
@@ -136,7 +128,7 @@ extern "C" TESSARINE_API int32_t ClipBezierCV(double xmin, double ymin, double x
     for (int i = 0; i < n; ++i) {
         BZ_Curve left;
         BZ_Curve right;
-        Split(rest, cuts[i].t, &left, &right);
+        tessarine::curves::SplitCurveAt(rest, cuts[i].t, &left, &right);
         if (MiddleInside(left, rect)) out[(*count)++] = left;
         rest = right;
         for (int j = i + 1; j < n; ++j) cuts[j].t = (cuts[j].t - cuts[i].t) / (1 - cuts[i].t);

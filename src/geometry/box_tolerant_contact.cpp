@@ -7,6 +7,7 @@
 
 #include "core/status.h"
 #include "geometry/kernel.h"
+#include "curves/split.h"
 #include "geometry/stroke.h"
 
 using namespace tessarine;
@@ -91,7 +92,7 @@ TESSARINE_API int32_t BZ_CurveBBoxInt(double x0, double y0, double x1, double y1
         }
         BZ_Curve left;
         BZ_Curve right;
-        SplitCurveInHalf(c, &left, &right);
+        curves::SplitCurveAt(c, 0.5, &left, &right);
         if (BZ_IsPtInBBox(&left.p3, min, max, tolerance)) {
             *result = 1;
             return kOk;

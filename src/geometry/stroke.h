@@ -15,9 +15,6 @@ int32_t VC_FlatByChord(const BZ_Curve &curve, double tolerance);
 // 1 for flat, 0 for not flat, by the method's test.
 int32_t VC_CurveIsFlat(int16_t method, const BZ_Curve &curve, double tolerance);
 
-// Halves at t = 0.5; the middle point is left.p3 and right.p0.
-void SplitCurveInHalf(const BZ_Curve &curve, BZ_Curve *left, BZ_Curve *right);
-
 // The caller's two-tier output: fixed arrays of 256 first, heap arrays that
 // live across calls beyond that.
 struct SampleBuffers {
@@ -46,5 +43,9 @@ int32_t GrowSampleArrays(BZ_Point **points, double **params, int64_t entries);
 
 // Entries a heap array really has room for (0 for none).
 int64_t SampleRoom(const void *block, int64_t entrySize);
+template <typename T>
+bool HasRoom(const T *block, int64_t entries) {
+    return SampleRoom(block, sizeof(T)) >= entries;
+}
 
 }  // namespace tessarine::geometry

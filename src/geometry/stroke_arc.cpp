@@ -20,11 +20,6 @@ double AngleStep(const VC_StrokeSpec &spec, double R, double sweep) {
     return 2 * std::fabs(BZ_acos(std::sqrt((c / 2 + R) * (R - c / 2)) / R));
 }
 
-template <typename T>
-bool HasRoom(const T *block, int64_t entries) {
-    return SampleRoom(block, sizeof(T)) >= entries;
-}
-
 // Heap arrays with room for `entries`; onHeap becomes 1. capacity is not
 // this operation's to keep.
 int32_t PrepareHeap(const SampleBuffers &out, int64_t needed, int64_t entries, bool withParams) {

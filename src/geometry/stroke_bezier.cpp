@@ -3,6 +3,7 @@
 #include <cstdint>
 
 #include "core/status.h"
+#include "curves/split.h"
 #include "geometry/stroke.h"
 
 using namespace tessarine;
@@ -37,7 +38,7 @@ WalkResult WalkCurve(const VC_StrokeSpec &spec, const BZ_Curve &curve, bool trac
     if (spec.split == 2) {
         BZ_Curve left;
         BZ_Curve right;
-        SplitCurveInHalf(curve, &left, &right);
+        curves::SplitCurveAt(curve, 0.5, &left, &right);
         if (!VC_CurveIsFlat(spec.method, left, tol) || !VC_CurveIsFlat(spec.method, right, tol))
             return {kOk, Walk::GaveUp};
         int32_t s = append(curve.p0, 0.0, false);
@@ -70,7 +71,7 @@ WalkResult WalkCurve(const VC_StrokeSpec &spec, const BZ_Curve &curve, bool trac
         if (4 * depth >= kStackLimitPoints) return {kErrStackOverflow, Walk::Done};
         BZ_Curve left;
         BZ_Curve right;
-        SplitCurveInHalf(last, &left, &right);
+        curves::SplitCurveAt(last, 0.5, &left, &right);
         const double tM = trackParams ? (tA + tB) / 2 : 0;
         stack[depth] = right;
         ranges[2 * depth] = trackParams ? tM : 0;

@@ -3,18 +3,10 @@
 
 #include <cmath>
 
+#include "curves/split.h"
 #include "geometry/stroke.h"
 
 namespace tessarine::geometry {
-
-void SplitCurveInHalf(const BZ_Curve &c, BZ_Curve *left, BZ_Curve *right) {
-    left->p0 = c.p0;
-    right->p3 = c.p3;
-    SubDivideBezier(c.p0.x, c.p0.y, c.p1.x, c.p1.y, c.p2.x, c.p2.y, c.p3.x, c.p3.y, 0.5,
-                    &left->p1.x, &left->p1.y, &right->p2.x, &right->p2.y, &left->p2.x,
-                    &left->p2.y, &left->p3.x, &left->p3.y, &right->p1.x, &right->p1.y);
-    right->p0 = left->p3;
-}
 
 int32_t VC_FlatByPolygon(const BZ_Curve &c, double tolerance) {
     BZ_Point v{c.p0.x - c.p3.x, c.p0.y - c.p3.y};
@@ -39,7 +31,7 @@ int32_t VC_FlatByPolygon(const BZ_Curve &c, double tolerance) {
 int32_t VC_FlatByChord(const BZ_Curve &c, double tolerance) {
     BZ_Curve left;
     BZ_Curve right;
-    SplitCurveInHalf(c, &left, &right);
+    curves::SplitCurveAt(c, 0.5, &left, &right);
     const BZ_Point m = left.p3;
     const double limit = tolerance * tolerance;
     return DistanceSQ(c.p0.x, c.p0.y, m.x, m.y) <= limit &&

@@ -14,11 +14,6 @@ namespace {
 // longer fit a 32-bit size.
 constexpr double kMostHeapSamples = static_cast<double>(UINT32_MAX / sizeof(BZ_Point) - 256);
 
-template <typename T>
-bool HasRoom(const T *block, int64_t entries) {
-    return SampleRoom(block, sizeof(T)) >= entries;
-}
-
 // Brings the heap arrays to room for `count` points. Writes capacity.
 int32_t PrepareHeap(const SampleBuffers &out, int32_t count, bool withParams) {
     double **params = withParams ? out.heapParams : nullptr;

@@ -621,16 +621,19 @@ TEST_F(StrokeTest, StrokedCurvesStayOnTheCurveWithinTheTolerance) {
             EXPECT_NEAR(s.points[k].x, w * w * w * v[0] + 3 * w * w * t * v[2] + 3 * w * t * t * v[4] + t * t * t * v[6], 1e-9);
             if (k > 0) {
                 EXPECT_GT(s.params[k], s.params[k - 1]);
-                if (method == 1)
+                if (method == 1) {
                     EXPECT_LE(std::hypot(s.points[k].x - s.points[k - 1].x,
                                          s.points[k].y - s.points[k - 1].y),
                               tol * (1 + 1e-12));
+                }
             }
         }
         // The polygon test pairs the smaller factor (4/9) with handles on one
         // side of the chord, where the curve can stand 3/4 of the larger
         // handle distance away: with the 0.9 margin that allows 1.52 tol.
-        if (method == 0) EXPECT_LE(PolylineError(v, s.points, s.count), 1.52 * tol);
+        if (method == 0) {
+            EXPECT_LE(PolylineError(v, s.points, s.count), 1.52 * tol);
+        }
     }
 }
 
