@@ -15,10 +15,24 @@ namespace {
 
 class BezierToArcTest : public CurveTest {};
 
+// An entry with its fields aligned, so that the test macros can bind to them
+// (the packed form has doubles 4 bytes off).
+struct Entry {
+    double a, b, c, d, e;
+    int isArc;
+};
+
 struct Fit {
     int32_t result = -1;
     int16_t count = -1;
     ArcFitEntry entries[101];
+    Entry u[101];
+    void Unpack() {
+        for (int i = 0; i < 101; ++i) {
+            const ArcFitEntry &p = entries[i];
+            u[i] = Entry{p.a, p.b, p.c, p.d, p.e, p.isArc};
+        }
+    }
 };
 
 Fit FitCurve(double tol, const Cubic &c) {
@@ -26,10 +40,11 @@ Fit FitCurve(double tol, const Cubic &c) {
     std::memset(f.entries, 0xAB, sizeof f.entries);
     f.result = BezierToArc(tol, c.v[0], c.v[1], c.v[2], c.v[3], c.v[4], c.v[5], c.v[6], c.v[7],
                            f.entries, &f.count);
+    f.Unpack();
     return f;
 }
 
-BZ_Point OnEntry(const ArcFitEntry &e, double s) {
+BZ_Point OnEntry(const Entry &e, double s) {
     if (e.isArc == 0) return BZ_Point{e.a + (e.c - e.a) * s, e.b + (e.d - e.b) * s};
     const double r = std::fabs(e.c);
     const double angle = e.d + e.e * s;
@@ -41,7 +56,7 @@ double ChainDeviation(const Fit &f, const Cubic &c) {
     double worst = 0;
     for (int i = 0; i < f.count; ++i)
         for (int k = 0; k <= 24; ++k)
-            worst = std::fmax(worst, NearestOnCurve(c, OnEntry(f.entries[i], k / 24.0)));
+            worst = std::fmax(worst, NearestOnCurve(c, OnEntry(f.u[i], k / 24.0)));
     return worst;
 }
 
@@ -51,21 +66,21 @@ TEST_F(BezierToArcTest, StraightCubicWithHandlesOnTheChordGivesOneLine) {
     const Fit f = FitCurve(0.01, Cubic{{0, 0, 1, 1, 2, 2, 3, 3}});
     ASSERT_EQ(f.result, 1);
     ASSERT_EQ(f.count, 1);
-    EXPECT_EQ(f.entries[0].isArc, 0);
-    EXPECT_EQ(f.entries[0].a, 0);
-    EXPECT_EQ(f.entries[0].b, 0);
-    EXPECT_EQ(f.entries[0].c, 3);
-    EXPECT_EQ(f.entries[0].d, 3);
-    EXPECT_EQ(f.entries[0].e, 0);
+    EXPECT_EQ(f.u[0].isArc, 0);
+    EXPECT_EQ(f.u[0].a, 0);
+    EXPECT_EQ(f.u[0].b, 0);
+    EXPECT_EQ(f.u[0].c, 3);
+    EXPECT_EQ(f.u[0].d, 3);
+    EXPECT_EQ(f.u[0].e, 0);
 }
 
 TEST_F(BezierToArcTest, HandlePointingBackwardsAlongTheChordGivesOneLine) {
     const Fit f = FitCurve(0.01, Cubic{{0, 0, -1, 0, 2, 0, 3, 0}});
     ASSERT_EQ(f.result, 1);
     ASSERT_EQ(f.count, 1);
-    EXPECT_EQ(f.entries[0].isArc, 0);
-    EXPECT_EQ(f.entries[0].c, 3);
-    EXPECT_EQ(f.entries[0].e, 0);
+    EXPECT_EQ(f.u[0].isArc, 0);
+    EXPECT_EQ(f.u[0].c, 3);
+    EXPECT_EQ(f.u[0].e, 0);
 }
 
 TEST_F(BezierToArcTest, QuarterCircleIsHalvedIntoTwoArcsThatDoNotMerge) {
@@ -74,7 +89,7 @@ TEST_F(BezierToArcTest, QuarterCircleIsHalvedIntoTwoArcsThatDoNotMerge) {
     ASSERT_EQ(f.count, 2);
     double total = 0;
     for (int i = 0; i < 2; ++i) {
-        const ArcFitEntry &e = f.entries[i];
+        const Entry &e = f.u[i];
         EXPECT_EQ(e.isArc, 1);
         // The cubic is not quite a circle: the circle through three of its
         // points sits a little off the unit circle.
@@ -99,9 +114,9 @@ TEST_F(BezierToArcTest, ClockwiseArcKeepsAPositiveRadius) {
     ASSERT_EQ(f.result, 1);
     ASSERT_GE(f.count, 1);
     for (int i = 0; i < f.count; ++i) {
-        EXPECT_EQ(f.entries[i].isArc, 1);
-        EXPECT_GT(f.entries[i].c, 0);
-        EXPECT_LT(f.entries[i].e, 0);
+        EXPECT_EQ(f.u[i].isArc, 1);
+        EXPECT_GT(f.u[i].c, 0);
+        EXPECT_LT(f.u[i].e, 0);
     }
 }
 
@@ -111,10 +126,10 @@ TEST_F(BezierToArcTest, ClosedCurveWithEqualEndsIsOneZeroLengthLine) {
     const Fit f = FitCurve(0.01, Cubic{{0, 0, 5, 5, -5, 5, 0, 0}});
     EXPECT_EQ(f.result, 1);
     ASSERT_EQ(f.count, 1);
-    EXPECT_EQ(f.entries[0].isArc, 0);
-    EXPECT_EQ(f.entries[0].a, 0);
-    EXPECT_EQ(f.entries[0].c, 0);
-    EXPECT_EQ(f.entries[0].e, 0);
+    EXPECT_EQ(f.u[0].isArc, 0);
+    EXPECT_EQ(f.u[0].a, 0);
+    EXPECT_EQ(f.u[0].c, 0);
+    EXPECT_EQ(f.u[0].e, 0);
 }
 
 TEST_F(BezierToArcTest, NearlyClosedCurveIsHalvedAndFollowsTheCurve) {
@@ -129,9 +144,9 @@ TEST_F(BezierToArcTest, AllFourPointsEqualGiveAZeroLengthLine) {
     const Fit f = FitCurve(0.01, Cubic{{2, 3, 2, 3, 2, 3, 2, 3}});
     EXPECT_EQ(f.result, 1);
     ASSERT_EQ(f.count, 1);
-    EXPECT_EQ(f.entries[0].isArc, 0);
-    EXPECT_EQ(f.entries[0].a, 2);
-    EXPECT_EQ(f.entries[0].d, 3);
+    EXPECT_EQ(f.u[0].isArc, 0);
+    EXPECT_EQ(f.u[0].a, 2);
+    EXPECT_EQ(f.u[0].d, 3);
 }
 
 TEST_F(BezierToArcTest, SShapedCurveIsHalved) {
@@ -155,7 +170,7 @@ TEST_F(BezierToArcTest, MoreThanAHundredElementsEndWithZeroAndKeepThem) {
     const Fit f = FitCurve(1e-6, wave);
     EXPECT_EQ(f.result, 0);
     EXPECT_EQ(f.count, 101);
-    for (int i = 0; i < f.count; ++i) EXPECT_TRUE(f.entries[i].isArc == 0 || f.entries[i].isArc == 1);
+    for (int i = 0; i < f.count; ++i) EXPECT_TRUE(f.u[i].isArc == 0 || f.u[i].isArc == 1);
 }
 
 TEST_F(BezierToArcTest, StackThatCannotBeAllocatedGivesZeroAndLeavesTheCount) {
