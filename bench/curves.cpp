@@ -75,8 +75,7 @@ void Intersect(const Pair &p) {
     BZ_Point pts[14];
     uint16_t count = 0;
     int16_t kind = 0;
-    benchmark::DoNotOptimize(
-        NewCurveCurveIntersect(p.a, p.b, tA, tB, pts, &count, 1e-6, &kind));
+    benchmark::DoNotOptimize(NewCurveCurveIntersect(p.a, p.b, tA, tB, pts, &count, 1e-6, &kind));
     benchmark::DoNotOptimize(pts);
 }
 
@@ -127,8 +126,8 @@ struct ArcInput {
 void BM_ConvertArcToBezier(benchmark::State &state) {
     std::vector<ArcInput> arcs;
     std::mt19937_64 rng(5);
-    std::uniform_real_distribution<double> pos(-100, 100), rad(0.1, 50),
-        ang(0, 6.283185307179586), sweep(-7, 7);
+    std::uniform_real_distribution<double> pos(-100, 100), rad(0.1, 50), ang(0, 6.283185307179586),
+        sweep(-7, 7);
     for (int i = 0; i < 256; ++i)
         arcs.push_back({rad(rng), pos(rng), pos(rng), ang(rng), sweep(rng)});
     BZ_Point nodes[18];
@@ -164,7 +163,11 @@ void BM_ConvertArcToBezier(benchmark::State &state) {
     RecordMedian("ConvertArcToBezier arcs vs sine and cosine of five angles", ratios);
 }
 
-BENCHMARK(BM_CurvePairs)->Arg(kCrossing)->Arg(kDisjoint)->Arg(kTouching)->Arg(kCoincident)
+BENCHMARK(BM_CurvePairs)
+    ->Arg(kCrossing)
+    ->Arg(kDisjoint)
+    ->Arg(kTouching)
+    ->Arg(kCoincident)
     ->UseManualTime();
 BENCHMARK(BM_ConvertArcToBezier)->UseManualTime();
 

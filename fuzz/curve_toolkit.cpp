@@ -29,8 +29,8 @@ void Curves(Reader &in) {
     double dist, t, x, y;
     SelectCurveTo_port(a[0], a[1], a[2], a[3], a[4], a[5], a[6], a[7], &dist, &t, &x, &y, b[0],
                        b[1], tol, tol, tol);
-    SarnSelectCurveTo(a[0], a[1], a[2], a[3], a[4], a[5], a[6], a[7], &dist, &t, &x, &y, b[0],
-                      b[1], b[2], b[3]);
+    SarnSelectCurveTo(a[0], a[1], a[2], a[3], a[4], a[5], a[6], a[7], &dist, &t, &x, &y, b[0], b[1],
+                      b[2], b[3]);
 }
 
 void Conversions(Reader &in) {

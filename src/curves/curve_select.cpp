@@ -21,7 +21,9 @@ struct Sextic {
     }
 };
 
-double Dot(BZ_Point u, BZ_Point v) { return u.x * v.x + u.y * v.y; }
+double Dot(BZ_Point u, BZ_Point v) {
+    return u.x * v.x + u.y * v.y;
+}
 
 }  // namespace
 
@@ -132,9 +134,9 @@ TESSARINE_API int32_t SarnSelectCurveTo(double x0, double y0, double x1, double 
 }
 
 TESSARINE_API int32_t SelectCurveTo_port(double x0, double y0, double x1, double y1, double x2,
-                                         double y2, double x3, double y3, double *dist,
-                                         double *t, double *x, double *y, double px, double py,
-                                         double limit, double eps, double reject) {
+                                         double y2, double x3, double y3, double *dist, double *t,
+                                         double *x, double *y, double px, double py, double limit,
+                                         double eps, double reject) {
     // A first-order estimate of the distance to the cubic's implicit locus:
     // the implicit equation at the pick point over its gradient.
     const BZ_Point d1{x1 - x0, y1 - y0}, d2{x2 - x1, y2 - y1}, d3{x3 - x2, y3 - y2};

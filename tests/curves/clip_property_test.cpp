@@ -92,8 +92,8 @@ TEST(CurveClipProperty, PairsBuiltToCrossReportTheirPoint) {
         // stays: the crossing may be represented by a neighbour.
         int at = -1;
         for (int k = 0; k < h.count; ++k) {
-            if (std::fabs(h.tA[k] - ta) <= 0.001 + 1e-5 && (at < 0 || Dist(h.pts[k], p) <
-                                                                         Dist(h.pts[at], p)))
+            if (std::fabs(h.tA[k] - ta) <= 0.001 + 1e-5 &&
+                (at < 0 || Dist(h.pts[k], p) < Dist(h.pts[at], p)))
                 at = k;
         }
         if (at < 0) {

@@ -153,8 +153,8 @@ TEST_F(CurveClip, NearbyCurvesGiveStretchesOnBoth) {
 
 TEST_F(CurveClip, LineAgainstCurveGivesParametersOnTheLine) {
     Hits h;
-    h.status = NewLineCurveIntersect(-1, 1, 5, 1, kArch.v, h.tA, h.tB, h.pts, &h.count, 1e-7,
-                                     &h.kind);
+    h.status =
+        NewLineCurveIntersect(-1, 1, 5, 1, kArch.v, h.tA, h.tB, h.pts, &h.count, 1e-7, &h.kind);
     EXPECT_EQ(h.status, 10);
     EXPECT_EQ(h.kind, 1);
     ASSERT_EQ(h.count, 2);
@@ -167,8 +167,8 @@ TEST_F(CurveClip, LineAgainstCurveGivesParametersOnTheLine) {
 
 TEST_F(CurveClip, ShortLineAwayFromTheCurveIsADot) {
     Hits h;
-    h.status = NewLineCurveIntersect(10, 10, 10, 10 + 1e-9, kArch.v, h.tA, h.tB, h.pts,
-                                     &h.count, 1e-6, &h.kind);
+    h.status = NewLineCurveIntersect(10, 10, 10, 10 + 1e-9, kArch.v, h.tA, h.tB, h.pts, &h.count,
+                                     1e-6, &h.kind);
     EXPECT_EQ(h.status, -1);
     EXPECT_EQ(h.kind, 2);
     EXPECT_EQ(h.count, 0);

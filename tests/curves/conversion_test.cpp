@@ -124,8 +124,8 @@ TEST(CurveArcNodes, NonFiniteInputWritesNothing) {
     for (double v : bad) {
         for (int which = 0; which < 3; ++which) {
             Nodes n;
-            ConvertArcToBezier(which == 0 ? v : 1, 0, 0, which == 1 ? v : 0,
-                               which == 2 ? v : 1, n.p, &n.count);
+            ConvertArcToBezier(which == 0 ? v : 1, 0, 0, which == 1 ? v : 0, which == 2 ? v : 1,
+                               n.p, &n.count);
             EXPECT_EQ(n.count, 0);
             EXPECT_EQ(n.p[0].x, kSentinel);
         }
@@ -161,7 +161,7 @@ struct Spline {
 };
 
 void RunSpline(Spline &s, const double *x, const double *y, int16_t n, double stx = 0,
-         double sty = 0, double etx = 0, double ety = 0) {
+               double sty = 0, double etx = 0, double ety = 0) {
     s.status = ArcToBezier(x, y, n, stx, sty, etx, ety, &s.x, &s.y, &s.count);
 }
 
@@ -425,8 +425,8 @@ TEST(CurveExtent, TableCasesAndNegativeSweep) {
 
 TEST(CurveSplit, SubDivideBezierWritesTheHalvesInItsOrder) {
     double v[10];
-    SubDivideBezier(0, 0, 1, 2, 3, 2, 4, 0, 0.25, &v[0], &v[1], &v[2], &v[3], &v[4], &v[5],
-                    &v[6], &v[7], &v[8], &v[9]);
+    SubDivideBezier(0, 0, 1, 2, 3, 2, 4, 0, 0.25, &v[0], &v[1], &v[2], &v[3], &v[4], &v[5], &v[6],
+                    &v[7], &v[8], &v[9]);
     auto lerp = [](double a, double b, double t) { return (b - a) * t + a; };
     const double l1x = lerp(0, 1, 0.25), qx = lerp(1, 3, 0.25), r2x = lerp(3, 4, 0.25);
     const double l2x = lerp(l1x, qx, 0.25), r1x = lerp(qx, r2x, 0.25);

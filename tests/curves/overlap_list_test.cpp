@@ -218,6 +218,21 @@ TEST(CurveFrames, BandsFollowTheInnerPoints) {
     EXPECT_EQ(along.smax, 5);
 }
 
+TEST(CurveFrames, TheAlongBandIsNarrowerThanTheCurveOnPurpose) {
+    // The first inner point reaches furthest along the chord, but only the
+    // second and the end count for smax: the curve reaches x = 4.5 or so,
+    // the band stops at 4.
+    const BZ_Curve c{{0, 0}, {10, 1}, {2, 1}, {4, 0}};
+    const ClipFrame f = BuildClipFrame(c);
+    EXPECT_EQ(f.smin, 0);
+    EXPECT_EQ(f.smax, 4);
+    const Cubic curve{{0, 0, 10, 1, 2, 1, 4, 0}};
+    EXPECT_GT(PointAt(curve, 0.25).x, 4.3);
+    // A piece across the curve at x = 4.3 is judged apart.
+    const BZ_Curve across{{4.3, -1}, {4.3, 0}, {4.3, 1}, {4.3, 2}};
+    EXPECT_FALSE(FrameTouchesCurve(f, across));
+}
+
 TEST(CurveFrames, FramesApartDoNotTouch) {
     const BZ_Curve a{{0, 0}, {1, 1}, {2, 1}, {3, 0}};
     const BZ_Curve far{{0, 5}, {1, 6}, {2, 6}, {3, 5}};

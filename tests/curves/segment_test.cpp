@@ -16,11 +16,11 @@ struct Seg {
 };
 
 Seg Segs(double x0, double y0, double x1, double y1, double x2, double y2, double x3, double y3,
-        double tol, int16_t overlap = 1, double a0 = 0, double a1 = 1, double b0 = 0,
-        double b1 = 1) {
+         double tol, int16_t overlap = 1, double a0 = 0, double a1 = 1, double b0 = 0,
+         double b1 = 1) {
     Seg s;
-    s.status = NewLineSegSegIntersect(x0, y0, x1, y1, x2, y2, x3, y3, a0, a1, b0, b1, overlap,
-                                      s.tA, s.tB, s.pts, &s.count, tol, &s.kind);
+    s.status = NewLineSegSegIntersect(x0, y0, x1, y1, x2, y2, x3, y3, a0, a1, b0, b1, overlap, s.tA,
+                                      s.tB, s.pts, &s.count, tol, &s.kind);
     return s;
 }
 
