@@ -164,6 +164,16 @@ TEST_F(BezierToArcTest, ZeroToleranceRunsOutOfStackOrCountAndEndsWithZero) {
     EXPECT_LE(f.count, 101);
 }
 
+TEST_F(BezierToArcTest, HalvingPastTheStackEndsWithZeroNotAnOverrun) {
+    // Coordinates that are no numbers are never a line nor an arc: each
+    // halving leaves one more curve on the stack until it would pass 100
+    // points.
+    const double n = NAN;
+    const Fit f = FitCurve(0.01, Cubic{{n, n, n, n, n, n, n, n}});
+    EXPECT_EQ(f.result, 0);
+    EXPECT_EQ(f.count, 0);
+}
+
 TEST_F(BezierToArcTest, MoreThanAHundredElementsEndWithZeroAndKeepThem) {
     // A long wavy curve at a fine tolerance: many elements, shallow halving.
     const Cubic wave{{0, 0, 3000, 9000, -2000, -9000, 1000, 0}};

@@ -203,9 +203,13 @@ TEST_F(StrokeTest, LinePointsLieOnTheLineWithChordsWithinTheStep) {
         for (int k = 0; k < s.count; ++k) {
             const double cross = (x1 - x0) * (p[k].y - y0) - (y1 - y0) * (p[k].x - x0);
             EXPECT_LE(std::fabs(cross) / std::hypot(x1 - x0, y1 - y0), 1e-9);
-            if (k > 0) EXPECT_LE(std::hypot(p[k].x - p[k - 1].x, p[k].y - p[k - 1].y), step + 1e-9);
+            if (k > 0) {
+                EXPECT_LE(std::hypot(p[k].x - p[k - 1].x, p[k].y - p[k - 1].y), step + 1e-9);
+            }
         }
-        if (s.count > 1) EXPECT_NEAR(p[s.count - 1].x, x1, 1e-12);
+        if (s.count > 1) {
+            EXPECT_NEAR(p[s.count - 1].x, x1, 1e-12);
+        }
     }
 }
 
