@@ -18,6 +18,10 @@ namespace {
 // 256 points are tested before eight more go on.
 constexpr int kStackCurves = 66;
 constexpr int kStackLimitPoints = 256;
+// The stack bounds the depth but not the breadth: a curve of values near
+// the smallest doubles can keep a full tree of pieces beside the box without
+// any of them reaching the bound. So many halvings end the same way.
+constexpr int64_t kMostHalvings = int64_t{1} << 20;
 
 }  // namespace
 
@@ -71,6 +75,7 @@ TESSARINE_API int32_t BZ_CurveBBoxInt(double x0, double y0, double x1, double y1
         return kOk;
     }
     BZ_Curve stack[kStackCurves];
+    int64_t halvings = 0;
     int depth = 0;
     stack[depth++] = curve;
     while (depth > 0) {
@@ -86,7 +91,7 @@ TESSARINE_API int32_t BZ_CurveBBoxInt(double x0, double y0, double x1, double y1
             }
             continue;
         }
-        if (4 * depth >= kStackLimitPoints) {
+        if (4 * depth >= kStackLimitPoints || ++halvings > kMostHalvings) {
             *result = 0;
             return kErrStackOverflow;
         }

@@ -292,3 +292,20 @@ TEST_F(BoxTest, CurveContactAgreesWithDenseSampling) {
 }
 
 }  // namespace
+
+namespace {
+
+TEST_F(BoxTest, CurveOfTinyValuesEndsWithinItsHalvingBound) {
+    // A curve that shrinks from 1 to values near the smallest doubles keeps
+    // a whole tree of unflat pieces beside the box without passing 64
+    // pending ones; the work still ends, with -56.
+    const double v[8] = {1.0, 0.0, -4.1861829451057006e-203, -2.3534370769818398e-185,
+                         1.7709328094115e-310, 6.212759e-317, -2.3534373745633116e-185,
+                         8.34402750790665e-310};
+    int32_t status = 0;
+    const int32_t r = CurveContact(v, -4.1614403441363077e+160, 0, 0, 0, 0, &status);
+    EXPECT_EQ(status, -56);
+    EXPECT_EQ(r, 0);
+}
+
+}  // namespace
