@@ -233,10 +233,8 @@ TESSARINE_API int32_t BZ_ARCboxintersected(double xmin, double ymin, double xmax
 /* 1 for contact with the box grown by the tolerance, 0 for none. */
 TESSARINE_API int32_t BZ_LineBBoxInt(const BZ_Point *p0, const BZ_Point *p1, const BZ_Point *min,
                                      const BZ_Point *max, double tolerance);
-/* 10, or -56 (result 0) when the halving passes 64 pending pieces (or more
-   than 1048576 halvings, which only curves of values near the smallest
-   doubles ask for); result is 1 for contact with the box grown by the
-   tolerance, 0 for none. */
+/* 10, or -56 (result 0) when the halving passes 64 pending pieces; result
+   is 1 for contact with the box grown by the tolerance, 0 for none. */
 TESSARINE_API int32_t BZ_CurveBBoxInt(double x0, double y0, double x1, double y1, double x2,
                                       double y2, double x3, double y3, const BZ_Point *min,
                                       const BZ_Point *max, double tolerance, int32_t *result);
