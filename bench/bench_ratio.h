@@ -5,6 +5,8 @@
 
 #include <benchmark/benchmark.h>
 
+#include <algorithm>
+#include <chrono>
 #include <cstdio>
 #include <map>
 #include <string>
@@ -33,6 +35,28 @@ inline std::vector<MeasuredRatio> &Measured() {
 
 inline void RecordRatio(const std::string &name, double ratio, double target = 0) {
     Measured().push_back({name, ratio, target});
+}
+
+// For benchmarks that time subject and baseline in turn: the library calls
+// a benchmark several times while it settles the number of rounds, and only
+// the last, longest call's median of the per-round ratios stands.
+inline void RecordMedianOfRounds(const std::string &what, std::vector<double> &ratios,
+                                 double target = 0) {
+    if (ratios.empty()) return;
+    std::sort(ratios.begin(), ratios.end());
+    const std::string name = what + ", median of rounds taken in turn";
+    for (MeasuredRatio &r : Measured()) {
+        if (r.name == name) {
+            r.ratio = ratios[ratios.size() / 2];
+            return;
+        }
+    }
+    RecordRatio(name, ratios[ratios.size() / 2], target);
+}
+
+inline double Seconds(std::chrono::steady_clock::time_point a,
+                      std::chrono::steady_clock::time_point b) {
+    return std::chrono::duration<double>(b - a).count();
 }
 
 inline void PrintRatio(const std::string &what, double ratio, double target) {

@@ -3,7 +3,7 @@
 # benchmarks need, when any is missing. Needs root (or sudo) only then.
 set -eu
 packages="cmake make g++ clang libclang-rt-14-dev pkg-config binutils libgtest-dev
-libbenchmark-dev liblcms2-dev libgs-common libvips-tools"
+libbenchmark-dev liblcms2-dev libgs-common libvips-tools libcairo2-dev"
 missing=""
 for p in $packages; do
   if ! dpkg-query -W -f='${Status}' "$p" 2>/dev/null | grep -q 'install ok installed'; then

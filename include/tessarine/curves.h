@@ -100,6 +100,42 @@ TESSARINE_API void TOV_GetLineSegArea(double x0, double y0, double x1, double y1
 
 /* ---- curve fitting and clipping ---- */
 
+/* One element of a fitted chain, 44 bytes apart. A line holds start (a, b),
+   end (c, d) and e 0 (or left as it was when a merge appended the line); an
+   arc holds centre (a, b), signed radius c (negative when it turns
+   counter-clockwise), start angle d in 0 to a full turn, and signed sweep e. */
+#pragma pack(push, 4)
+typedef struct ArcFitEntry {
+    double a;
+    double b;
+    double c;
+    double d;
+    double e;
+    uint8_t isArc;
+} ArcFitEntry;
+#pragma pack(pop)
+
+/* Replaces one cubic by lines and arcs within tol. entries needs room for 101
+   elements. Returns 1 on success and 0 on failure (a truth value, not a
+   status): too many elements, too deep a halving, or no memory. */
+TESSARINE_API int32_t BezierToArc(double tol, double x0, double y0, double x1, double y1,
+                                  double x2, double y2, double x3, double y3,
+                                  ArcFitEntry *entries, int16_t *count);
+
+/* Cuts a cubic by a rectangle and keeps the pieces inside; out needs room for
+   13 curves. */
+TESSARINE_API int32_t ClipBezierCV(double xmin, double ymin, double xmax, double ymax,
+                                   double x0, double y0, double x1, double y1, double x2,
+                                   double y2, double x3, double y3, int16_t *count,
+                                   BZ_Curve *out);
+/* The tight box of a cubic, from the extremes of the curve itself. */
+TESSARINE_API void CalcCurvePathExtent(double x0, double y0, double x1, double y1, double x2,
+                                       double y2, double x3, double y3, double *xmin,
+                                       double *ymin, double *xmax, double *ymax);
+/* The extent of one coordinate of a cubic. */
+TESSARINE_API void TOV_CalcComponentExt(double c0, double c1, double c2, double c3, double *min,
+                                        double *max);
+
 TESSARINE_END_C
 
 #endif

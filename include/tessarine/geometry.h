@@ -197,6 +197,123 @@ TESSARINE_API int32_t Chkcv2arc(double x0, double y0, double x1, double y1, doub
                                 double *sweep, int16_t *isArc);
 TESSARINE_API int32_t BZ_MirrorPt(const BZ_Point *a, const BZ_Point *b, BZ_Point *point);
 
+/* ---- Boxes and box tests -------------------------------------------------------------
+   Outcode bits: 1 x below xmin, 2 x above xmax, 4 y below ymin, 8 y above
+   ymax; a point on an edge is inside. Relation codes of the bare-box tests:
+   0 no contact found, 4 both ends outside and crossing, 5 start inside,
+   6 end inside, 7 both inside. */
+
+/* Copies the two points as they are; does not order them. */
+TESSARINE_API void AssigXQ2DBox(double x0, double y0, double x1, double y1, BZ_Point *first,
+                                BZ_Point *second);
+TESSARINE_API int32_t FindLineMinmaxBox(double x0, double y0, double x1, double y1, BZ_Point *min,
+                                        BZ_Point *max);
+/* The exact box of the curve, not of its control points. */
+TESSARINE_API int32_t BZ_FindCurveMinmaxBox(double x0, double y0, double x1, double y1,
+                                            double x2, double y2, double x3, double y3,
+                                            BZ_Point *min, BZ_Point *max);
+TESSARINE_API int32_t BZ_FindArcMinmaxBox(BZ_Arc arc, BZ_Point *min, BZ_Point *max);
+/* 1 when the point lies in the box grown by the tolerance, edges included. */
+TESSARINE_API int32_t BZ_IsPtInBBox(const BZ_Point *point, const BZ_Point *min,
+                                    const BZ_Point *max, double tolerance);
+TESSARINE_API double BZ_Mindistsqpt2BBox(double px, double py, double xmin, double ymin,
+                                         double xmax, double ymax);
+TESSARINE_API double BZ_Maxdistsqpt2BBox(double px, double py, double xmin, double ymin,
+                                         double xmax, double ymax);
+TESSARINE_API int16_t GetOutCode(double xmin, double ymin, double xmax, double ymax, double px,
+                                 double py);
+TESSARINE_API int16_t BZ_LNboxintersected(double xmin, double ymin, double xmax, double ymax,
+                                          double x0, double y0, double x1, double y1);
+TESSARINE_API int16_t BZ_CVboxintersected(double xmin, double ymin, double xmax, double ymax,
+                                          const BZ_Curve *curve);
+/* 1 for contact, 0 for none. */
+TESSARINE_API int32_t BZ_ARCboxintersected(double xmin, double ymin, double xmax, double ymax,
+                                           double centreX, double centreY, double radius,
+                                           double startAngle, double sweep);
+/* 1 for contact with the box grown by the tolerance, 0 for none. */
+TESSARINE_API int32_t BZ_LineBBoxInt(const BZ_Point *p0, const BZ_Point *p1, const BZ_Point *min,
+                                     const BZ_Point *max, double tolerance);
+/* 10, or -56 (result 0) when the halving passes 64 pending pieces; result
+   is 1 for contact with the box grown by the tolerance, 0 for none. */
+TESSARINE_API int32_t BZ_CurveBBoxInt(double x0, double y0, double x1, double y1, double x2,
+                                      double y2, double x3, double y3, const BZ_Point *min,
+                                      const BZ_Point *max, double tolerance, int32_t *result);
+
+/* ---- Stroking ----------------------------------------------------------------------
+   A stroke is a polyline of points on the segment, each optionally with its
+   parameter (0 at the start, 1 at the end).
+
+   method 0: tolerance is the polyline's largest error from the segment;
+   otherwise it is the longest chord. split (Bezier only): what to do with a
+   curve that is not flat at once: 0 subdivide, 1 give up with no output,
+   2 accept one split at 0.5 when both halves are flat, else give up. */
+typedef struct VC_StrokeSpec {
+    int16_t method;
+    double tolerance;
+    int16_t split;
+    int32_t reserved; /* read by no operation */
+} VC_StrokeSpec;
+
+/* Two-tier output (the VC_Sk... family and VC_StrokeLnUniform): count points;
+   onHeap 1 when they stand in the heap arrays, 0 in the fixed ones; capacity
+   of the heap arrays in points (0: none yet). fixedPoints and fixedParams
+   (null: no parameters) are the caller's arrays of 256. heapPoints and
+   heapParams (may be null) hold the caller's heap arrays: fixed blocks of the
+   library heap that live across calls and that the caller frees with
+   MEM_FreeHdl. When the library makes a new one it replaces whatever the
+   handle held. */
+TESSARINE_API int32_t VC_StrokeLnUniform(double step, double x0, double y0, double x1, double y1,
+                                         int32_t *count, int16_t *onHeap, int32_t *capacity,
+                                         BZ_Point *fixedPoints, double *fixedParams,
+                                         BZ_Point **heapPoints, double **heapParams);
+/* Does not maintain capacity: a caller that reuses the heap arrays sets it.
+   With onHeap 0 on entry, arrays that are needed are made afresh and replace
+   the handles; free earlier ones first. */
+TESSARINE_API int32_t VC_SkArc(VC_StrokeSpec spec, BZ_Arc arc, int32_t *count, int16_t *onHeap,
+                               int32_t *capacity, BZ_Point *fixedPoints, double *fixedParams,
+                               BZ_Point **heapPoints, double **heapParams);
+/* The points after the start up to the end; *points is a new block the caller
+   frees with MEM_FreeHdl (null when the count is 0 or below). */
+TESSARINE_API int32_t VC_renderArc(double tolerance, double unusedX, double unusedY,
+                                   double centreX, double centreY, double radius,
+                                   double startAngle, double sweep, int16_t *count,
+                                   BZ_Point **points);
+/* *points and *params (params may be null) are new blocks the caller frees
+   with MEM_FreeHdl; nothing is handed over on a failure or when the curve is
+   given up (count 0). */
+TESSARINE_API int32_t VC_StrokeBezierCurve(VC_StrokeSpec spec, double x0, double y0, double x1,
+                                           double y1, double x2, double y2, double x3, double y3,
+                                           int32_t *count, BZ_Point **points, double **params);
+/* Parameters are tracked only when fixedParams is given and *heapParams is
+   not null on entry; otherwise every point has 0 and the last 1. The 257th
+   point makes new heap arrays that replace the handles (free earlier ones
+   first). */
+TESSARINE_API int32_t VC_SkBezierCurve(VC_StrokeSpec spec, double x0, double y0, double x1,
+                                       double y1, double x2, double y2, double x3, double y3,
+                                       int32_t *count, int16_t *onHeap, int32_t *capacity,
+                                       BZ_Point *fixedPoints, double *fixedParams,
+                                       BZ_Point **heapPoints, double **heapParams);
+
+/* ---- Polynomial solving and curve-line intersection ------------------------------ */
+
+/* Roots of a x x + b x + c; -7 (nothing written) when there is no real root. */
+TESSARINE_API int32_t FindRootDegree2(double a, double b, double c, double *first,
+                                      double *second);
+/* Roots of a cubic that lie in -T to 1 + T (T = tolerance / 100) come first in
+   roots (room for three); count says how many. Always 10; a must not be 0. */
+TESSARINE_API int32_t CL_Solv3orderEq(double a, double b, double c, double d, double tolerance,
+                                      double *roots, int16_t *count, int16_t *flag);
+/* A curve (eight values) against a line; arrays need room for 14 entries.
+   curveT gets the parameters on the curve, lineT those on the line. */
+TESSARINE_API int32_t CL_CvLnIntersection(double x0, double y0, double x1, double y1, double x2,
+                                          double y2, double x3, double y3, double lx0, double ly0,
+                                          double lx1, double ly1, double tolerance,
+                                          uint16_t *count, BZ_Point *points, double *curveT,
+                                          double *lineT, int16_t *kind);
+/* The parameter of p on the segment a-b; -1 when p is off it. */
+TESSARINE_API int32_t GetparONln(double ax, double ay, double bx, double by, double px, double py,
+                                 double tolerance, double *t);
+
 TESSARINE_END_C
 
 #endif

@@ -54,7 +54,8 @@ void *FixedData(FixedHeader *header) { return header + 1; }
 
 // The one place memory is asked of the C allocator: counted for injection.
 void *Acquire(void *old, size_t bytes) {
-    if (bytes > kLargest || injection::ShouldFail(injection::kAlloc)) return nullptr;
+    if (bytes > kLargest || injection::TooLarge(bytes) || injection::ShouldFail(injection::kAlloc))
+        return nullptr;
     return std::realloc(old, bytes == 0 ? 1 : bytes);
 }
 

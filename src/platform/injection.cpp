@@ -15,6 +15,7 @@ struct Counter {
 };
 
 Counter g_counters[kSlots];
+std::atomic<size_t> g_sizeLimit{0};
 
 Slot SlotOf(testing::FileCall kind) {
     switch (kind) {
@@ -44,6 +45,11 @@ bool ShouldFail(Slot slot) {
     return false;
 }
 
+bool TooLarge(size_t bytes) {
+    const size_t limit = g_sizeLimit;
+    return limit != 0 && bytes > limit;
+}
+
 }  // namespace tessarine::platform::injection
 
 namespace tessarine::testing {
@@ -64,6 +70,8 @@ int64_t FileCallCount(FileCall kind) {
     return g_counters[platform::injection::SlotOf(kind)].calls;
 }
 bool FileFailureHit(FileCall kind) { return g_counters[platform::injection::SlotOf(kind)].hit; }
+
+void LimitAllocationSize(size_t bytes) { platform::injection::g_sizeLimit = bytes; }
 
 void ResetInjection() {
     for (int s = 0; s < platform::injection::kSlots; ++s)

@@ -2,6 +2,7 @@
 // the static build of the library.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 
 namespace tessarine::testing {
@@ -19,6 +20,11 @@ bool AllocationFailureHit();
 int64_t LiveBlocks();
 // The flag word of the latest GlobalAlloc call, whether it failed or not.
 uint32_t LastGlobalAllocFlags();
+
+// Make every allocation above this many bytes fail, as a small heap would
+// (for fuzz targets, whose inputs can ask for any size); 0 lifts the limit.
+// Not touched by ResetInjection.
+void LimitAllocationSize(size_t bytes);
 
 enum class FileCall { Read, Write, Seek };
 // Make the Nth call of that kind from now fail with EIO; 0 turns it off.
