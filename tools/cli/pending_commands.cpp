@@ -1,0 +1,19 @@
+// Subcommands whose library functions have not landed in this build yet.
+#include <ostream>
+
+#include "commands.h"
+#include "failure.h"
+
+namespace tessarine::cli {
+
+void RunConvert(const ConvertOptions &options, std::ostream &) {
+    throw Failure(options.input, "convert is not available in this build");
+}
+void RunLevels(const LevelsOptions &options, std::ostream &, std::ostream &) {
+    throw Failure(options.file, "levels is not available in this build");
+}
+void RunCut(const CutOptions &options, std::ostream &) {
+    throw Failure(options.input, "cut is not available in this build");
+}
+
+}  // namespace tessarine::cli
