@@ -1,5 +1,6 @@
 // tessarine export: a sub-bitmap of a tile file into a PNG or TIFF, from any
 // layout. CMYK becomes RGB through the device formulas or through profiles.
+#include <algorithm>
 #include <cstring>
 #include <ostream>
 #include <tessarine/profile.hpp>
@@ -30,6 +31,7 @@ class CmykToRgb {
         if (ValidateProfileType(destination_, rgb) != 1)
             throw Failure(rgbName_, "not an RGB profile that colours can be converted to");
     }
+    bool UsesProfiles() const { return useProfiles_; }
     void Convert(uint8_t *cmyk, uint8_t *rgb, int32_t count) {
         if (!useProfiles_) {
             for (int32_t i = 0; i < count; ++i) CX_SWOPCmyk2SRgb(cmyk + 4 * i, rgb + 3 * i);
@@ -93,7 +95,18 @@ void RunExport(const ExportOptions &options, std::ostream &out) {
 
     PendingOutput pending(options.output);
     auto writer = CreateRaster(type, pending.TempPath(), options.output, f);
-    std::vector<uint8_t> row(RowBytes(f) + 8), bytes(w * 4 + 16), interleaved(w * 4);
+    // A colour match costs a transform each call: rows go to it in batches.
+    const bool batched = b->imageType == 4 && cmyk && !options.tiffCmyk && toRgb.UsesProfiles();
+    const size_t batchRows = batched ? std::max<size_t>(1, (size_t(4) << 20) / (w * 4)) : 1;
+    std::vector<uint8_t> row(RowBytes(f) + 8), bytes(w * 4 + 16), interleaved(w * 4 * batchRows);
+    std::vector<uint8_t> batchRgb(batched ? w * 3 * batchRows : 0);
+    size_t batchedRows = 0;
+    auto flushBatch = [&] {
+        if (batchedRows == 0) return;
+        toRgb.Convert(interleaved.data(), batchRgb.data(), int32_t(batchedRows * w));
+        for (size_t i = 0; i < batchedRows; ++i) writer->WriteRow(batchRgb.data() + i * w * 3);
+        batchedRows = 0;
+    };
     {
         RowSession session(b, 1, uint8_t(options.sub), options.input);
         const int32_t n = f.width;
@@ -104,12 +117,16 @@ void RunExport(const ExportOptions &options, std::ostream &out) {
             } else if (b->imageType == 4) {
                 uint8_t *c = bytes.data(), *m = c + w, *ye = m + w, *k = ye + w;
                 Check(BI_GetCMYKRow(b, y, 0, n, c, m, ye, k), options.input, doing);
-                uint8_t *target = options.tiffCmyk ? row.data() : interleaved.data();
+                uint8_t *target = options.tiffCmyk ? row.data() : interleaved.data() + batchedRows * w * 4;
                 for (size_t x = 0; x < w; ++x) {
                     target[4 * x] = c[x];
                     target[4 * x + 1] = m[x];
                     target[4 * x + 2] = ye[x];
                     target[4 * x + 3] = k[x];
+                }
+                if (batched) {
+                    if (++batchedRows == batchRows) flushBatch();
+                    continue;
                 }
                 if (!options.tiffCmyk) toRgb.Convert(target, row.data(), n);
             } else if (b->imageType == 3) {
@@ -138,6 +155,7 @@ void RunExport(const ExportOptions &options, std::ostream &out) {
             }
             writer->WriteRow(row.data());
         }
+        flushBatch();
         session.End();
     }
     writer->Finish();

@@ -3,10 +3,12 @@
 
 #include "commands.h"
 #include "failure.h"
+#include "layouts.h"
 
 namespace tessarine::cli {
 
 void RunConvert(const ConvertOptions &options, std::ostream &) {
+    LayoutNamed(options.layout);
     throw Failure(options.input, "convert is not available in this build");
 }
 void RunLevels(const LevelsOptions &options, std::ostream &, std::ostream &) {

@@ -128,7 +128,8 @@ void TileImage::Load() {
     FileInfoGuard guard;
     int32_t s = HVT_TileFileBegin(bitmap_, &guard.info, 0);
     if (TS_FAILED(s)) {
-        if (TS_STATUS(s) == -50) throw Failure(path_, "not a tile bitmap file (cannot read its header)");
+        if (TS_STATUS(s) == -50)
+            throw Failure(path_, "corrupt or truncated tile file (its header or colour table cannot be read)");
         if (TS_STATUS(s) == -2) throw Failure(path_, "corrupt tile file: unknown colour model");
         if (TS_STATUS(s) == -5) throw Failure(path_, "corrupt tile file: sizes beyond memory");
         FailStatus(path_, "open the tile file", s);
@@ -207,7 +208,9 @@ NewTileImage::NewTileImage(const std::string &finalPath, const Layout &layout, i
     if (TS_FAILED(s)) {
         bitmap_ = nullptr;
         if (TS_STATUS(s) == -1)
-            throw Failure(finalPath, "cannot create a file in " + FolderOf(finalPath));
+            // The folder was found writable: what is left is memory or descriptors.
+            throw Failure(finalPath, "cannot make the tile file in " + FolderOf(finalPath) +
+                                         " (not enough memory, or too many open files)");
         FailStatus(finalPath, "create the tile file", s);
     }
 }
