@@ -197,6 +197,77 @@ TESSARINE_API int32_t Chkcv2arc(double x0, double y0, double x1, double y1, doub
                                 double *sweep, int16_t *isArc);
 TESSARINE_API int32_t BZ_MirrorPt(const BZ_Point *a, const BZ_Point *b, BZ_Point *point);
 
+/* ---- Stroking ----------------------------------------------------------------------
+   A stroke is a polyline of points on the segment, each optionally with its
+   parameter (0 at the start, 1 at the end).
+
+   method 0: tolerance is the polyline's largest error from the segment;
+   otherwise it is the longest chord. split (Bezier only): what to do with a
+   curve that is not flat at once: 0 subdivide, 1 give up with no output,
+   2 accept one split at 0.5 when both halves are flat, else give up. */
+typedef struct VC_StrokeSpec {
+    int16_t method;
+    double tolerance;
+    int16_t split;
+    int32_t reserved; /* read by no operation */
+} VC_StrokeSpec;
+
+/* Two-tier output (the VC_Sk... family and VC_StrokeLnUniform): count points;
+   onHeap 1 when they stand in the heap arrays, 0 in the fixed ones; capacity
+   of the heap arrays in points (0: none yet). fixedPoints and fixedParams
+   (null: no parameters) are the caller's arrays of 256. heapPoints and
+   heapParams (may be null) hold the caller's heap arrays: fixed blocks of the
+   library heap that live across calls and that the caller frees with
+   MEM_FreeHdl. When the library makes a new one it replaces whatever the
+   handle held. */
+TESSARINE_API int32_t VC_StrokeLnUniform(double step, double x0, double y0, double x1, double y1,
+                                         int32_t *count, int16_t *onHeap, int32_t *capacity,
+                                         BZ_Point *fixedPoints, double *fixedParams,
+                                         BZ_Point **heapPoints, double **heapParams);
+/* Does not maintain capacity: a caller that reuses the heap arrays sets it. */
+TESSARINE_API int32_t VC_SkArc(VC_StrokeSpec spec, BZ_Arc arc, int32_t *count, int16_t *onHeap,
+                               int32_t *capacity, BZ_Point *fixedPoints, double *fixedParams,
+                               BZ_Point **heapPoints, double **heapParams);
+/* The points after the start up to the end; *points is a new block the caller
+   frees with MEM_FreeHdl (null when the count is 0 or below). */
+TESSARINE_API int32_t VC_renderArc(double tolerance, double unusedX, double unusedY,
+                                   double centreX, double centreY, double radius,
+                                   double startAngle, double sweep, int16_t *count,
+                                   BZ_Point **points);
+/* *points and *params (params may be null) are new blocks the caller frees
+   with MEM_FreeHdl; nothing is handed over on a failure or when the curve is
+   given up (count 0). */
+TESSARINE_API int32_t VC_StrokeBezierCurve(VC_StrokeSpec spec, double x0, double y0, double x1,
+                                           double y1, double x2, double y2, double x3, double y3,
+                                           int32_t *count, BZ_Point **points, double **params);
+/* Parameters are tracked only when fixedParams is given and *heapParams is
+   not null on entry; otherwise every point has 0 and the last 1. */
+TESSARINE_API int32_t VC_SkBezierCurve(VC_StrokeSpec spec, double x0, double y0, double x1,
+                                       double y1, double x2, double y2, double x3, double y3,
+                                       int32_t *count, int16_t *onHeap, int32_t *capacity,
+                                       BZ_Point *fixedPoints, double *fixedParams,
+                                       BZ_Point **heapPoints, double **heapParams);
+
+/* ---- Polynomial solving and curve-line intersection ------------------------------ */
+
+/* Roots of a x x + b x + c; -7 (nothing written) when there is no real root. */
+TESSARINE_API int32_t FindRootDegree2(double a, double b, double c, double *first,
+                                      double *second);
+/* Roots of a cubic that lie in -T to 1 + T (T = tolerance / 100) come first in
+   roots (room for three); count says how many. Always 10; a must not be 0. */
+TESSARINE_API int32_t CL_Solv3orderEq(double a, double b, double c, double d, double tolerance,
+                                      double *roots, int16_t *count, int16_t *flag);
+/* A curve (eight values) against a line; arrays need room for 14 entries.
+   curveT gets the parameters on the curve, lineT those on the line. */
+TESSARINE_API int32_t CL_CvLnIntersection(double x0, double y0, double x1, double y1, double x2,
+                                          double y2, double x3, double y3, double lx0, double ly0,
+                                          double lx1, double ly1, double tolerance,
+                                          uint16_t *count, BZ_Point *points, double *curveT,
+                                          double *lineT, int16_t *kind);
+/* The parameter of p on the segment a-b; -1 when p is off it. */
+TESSARINE_API int32_t GetparONln(double ax, double ay, double bx, double by, double px, double py,
+                                 double tolerance, double *t);
+
 TESSARINE_END_C
 
 #endif

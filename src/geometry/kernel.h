@@ -37,4 +37,10 @@ int32_t BZ_ArcPairCentreDist(const BZ_Arc *arc1, const BZ_Arc *arc2, BZ_Point *o
 int32_t BZ_LineArcPerpProbe(const BZ_Line *line, const BZ_Arc *arc, BZ_Point *onLine,
                             double *lineT, BZ_Point *onArc, double *arcT, double *distance);
 
+// The three real roots of a depressed cubic (p, q, discriminant D, shift);
+// each lands at the next free place of roots, and count advances only for a
+// root in -T to 1 + T.
+void CL_ThreeRealRoots(double p, double q, double D, double shift, double T, double *roots,
+                       int16_t *count);
+
 }  // namespace tessarine::geometry
