@@ -140,7 +140,7 @@ TEST_F(RoundTrip, OneBitTiffBothPhotometrics) {
 }
 
 TEST_F(RoundTrip, CmykTiffKeptCmyk) {
-    Image in{8200, 1030, 4, 8, PHOTOMETRIC_SEPARATED};
+    Image in{8200, 1030, 4, 8, PHOTOMETRIC_SEPARATED, {}, {}};
     for (int y = 0; y < in.height; ++y) {
         std::vector<uint8_t> row(size_t(in.width) * 4);
         for (size_t i = 0; i < row.size(); ++i) row[i] = uint8_t(i * 3 + y * 11);
@@ -152,7 +152,7 @@ TEST_F(RoundTrip, CmykTiffKeptCmyk) {
 }
 
 TEST_F(RoundTrip, CmykToRgbByTheDeviceFormula) {
-    Image in{50, 20, 4, 8, PHOTOMETRIC_SEPARATED};
+    Image in{50, 20, 4, 8, PHOTOMETRIC_SEPARATED, {}, {}};
     for (int y = 0; y < in.height; ++y) {
         std::vector<uint8_t> row(size_t(in.width) * 4);
         for (size_t i = 0; i < row.size(); ++i) row[i] = uint8_t(i * 5 + y * 13);
@@ -169,7 +169,7 @@ TEST_F(RoundTrip, CmykToRgbByTheDeviceFormula) {
 }
 
 TEST_F(RoundTrip, CmykToRgbThroughProfiles) {
-    Image in{40, 10, 4, 8, PHOTOMETRIC_SEPARATED};
+    Image in{40, 10, 4, 8, PHOTOMETRIC_SEPARATED, {}, {}};
     for (int y = 0; y < in.height; ++y) in.rows.push_back(std::vector<uint8_t>(size_t(in.width) * 4, uint8_t(y * 20)));
     const std::string tif = Made("in.tif"), tile = Made("image.tsr"), back = Made("back.png");
     WriteTiff(tif, in);

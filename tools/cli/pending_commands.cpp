@@ -14,8 +14,5 @@ void RunConvert(const ConvertOptions &options, std::ostream &) {
 void RunLevels(const LevelsOptions &options, std::ostream &, std::ostream &) {
     throw Failure(options.file, "levels is not available in this build");
 }
-void RunCut(const CutOptions &options, std::ostream &) {
-    throw Failure(options.input, "cut is not available in this build");
-}
 
 }  // namespace tessarine::cli
