@@ -136,6 +136,133 @@ TESSARINE_API int32_t BI_GetBWPackedRow(BI_Bitmap *bitmap, int32_t y, int32_t x,
 TESSARINE_API int32_t BI_SetBWPackedRow(int32_t y, int32_t x, int32_t count, const uint8_t *packed,
                                         BI_Bitmap *bitmap);
 
+/* ---- Pixel movers ----------------------------------------------------------
+   Row primitives take the byte that holds a run's first pixel and that
+   pixel's phase: 0 to 7 at one bit (0 is the high bit), 0 or 1 at four bits.
+   They may read one byte past the run and, where documented, write bits
+   before or after it: buffers handed in must allow for that. A point is x
+   then y. Areas are a base, a stride in bytes and a rectangle. */
+
+TESSARINE_API void BI_CopyRow1BPPBits(int32_t count, uint8_t sourcePhase, const uint8_t *source,
+                                      uint8_t destinationPhase, uint8_t *destination);
+TESSARINE_API void BI_CopyRow4BPPBits(int32_t count, uint8_t sourcePhase, const uint8_t *source,
+                                      uint8_t destinationPhase, uint8_t *destination);
+TESSARINE_API void BI_MaskRow1BPPBits(int32_t count, uint8_t sourcePhase, const uint8_t *source,
+                                      uint8_t maskPhase, const uint8_t *mask,
+                                      uint8_t destinationPhase, uint8_t *destination);
+TESSARINE_API void BI_MaskRow4BPPBits(int32_t count, uint8_t sourcePhase, const uint8_t *source,
+                                      uint8_t maskPhase, const uint8_t *mask,
+                                      uint8_t destinationPhase, uint8_t *destination);
+TESSARINE_API int32_t BI_MemDirectCopyBits(uint8_t bitsPerPixel, int32_t sourceStride,
+                                           const RECT *sourceRect, const uint8_t *sourceBase,
+                                           int32_t destinationStride, int32_t x, int32_t y,
+                                           uint8_t *destinationBase);
+/* map has 256 entries; rowBuffer, when not null, holds the rectangle's width
+   in bytes. */
+TESSARINE_API int32_t BI_MemMapTableCopyBits(const uint8_t *map, uint8_t sourceBitsPerPixel,
+                                             int32_t sourceStride, const RECT *sourceRect,
+                                             const uint8_t *sourceBase,
+                                             uint8_t destinationBitsPerPixel,
+                                             int32_t destinationStride, int32_t x, int32_t y,
+                                             uint8_t *destinationBase, uint8_t *rowBuffer);
+TESSARINE_API int32_t BI_MemDirectMaskBits(uint8_t bitsPerPixel, int32_t sourceStride,
+                                           const RECT *sourceRect, const uint8_t *sourceBase,
+                                           int32_t maskStride, int32_t maskX, int32_t maskY,
+                                           const uint8_t *maskBase, int32_t destinationStride,
+                                           int32_t x, int32_t y, uint8_t *destinationBase);
+/* The DIB is one block: the header, its palette, then the pixels. */
+TESSARINE_API int32_t BI_MemBitsToDIB(const BI_Bitmap *bitmap, int32_t sourceStride,
+                                      const RECT *sourceRect, const uint8_t *sourceBase, int32_t x,
+                                      int32_t y, BITMAPINFOHEADER *dib);
+TESSARINE_API int32_t BI_DIBToMemBits(const RECT *sourceRect, const BITMAPINFOHEADER *dib,
+                                      const BI_Bitmap *bitmap, int32_t destinationStride,
+                                      int32_t x, int32_t y, uint8_t *destinationBase);
+TESSARINE_API void BI_FillByte(BI_Bitmap *bitmap, uint8_t value);
+TESSARINE_API void BI_ReverseByte(BI_Bitmap *bitmap);
+
+/* Same-layout moves between bitmaps in memory or in tile files. The mask is a
+   1-bit area in memory: a stride, a point (x, y) and a base. */
+TESSARINE_API int32_t BI_DirectCopyBmp(const RECT *sourceRect, BI_Bitmap *source,
+                                       const RECT *destinationRect, BI_Bitmap *destination,
+                                       uint8_t sourceSub, uint8_t destinationSub);
+TESSARINE_API int32_t BI_DirectMaskBmp(const RECT *sourceRect, BI_Bitmap *source,
+                                       int32_t maskStride, int32_t maskX, int32_t maskY,
+                                       const uint8_t *maskBase, const RECT *destinationRect,
+                                       BI_Bitmap *destination);
+/* Any pair of layouts. The first mask byte of each row is briefly changed and
+   put back: the mask must be writable and not shared during the call. */
+TESSARINE_API int32_t BI_MaskBmp(const RECT *sourceRect, BI_Bitmap *source, int32_t maskStride,
+                                 int32_t maskX, int32_t maskY, uint8_t *maskBase,
+                                 const RECT *destinationRect, BI_Bitmap *destination);
+
+/* Columns: count pixels down column x, from the top or from the bottom. The
+   unpacking reads pixel i at first + i * stride (from the bottom, output 0 is
+   the lowest pixel); x gives the pixel's place in its byte. */
+TESSARINE_API int32_t BI_UnpackRGBColTopdown(uint8_t imageType, uint8_t bitsPerPixel,
+                                             MEM_Handle table, int32_t stride,
+                                             const uint8_t *first, int32_t x, int32_t count,
+                                             uint8_t *r, uint8_t *g, uint8_t *b);
+TESSARINE_API int32_t BI_UnpackRGBColBottomup(uint8_t imageType, uint8_t bitsPerPixel,
+                                              MEM_Handle table, int32_t stride,
+                                              const uint8_t *first, int32_t x, int32_t count,
+                                              uint8_t *r, uint8_t *g, uint8_t *b);
+TESSARINE_API int32_t BI_GetRGBColTopdown(BI_Bitmap *bitmap, int32_t x, int32_t y, int32_t count,
+                                          uint8_t *r, uint8_t *g, uint8_t *b);
+TESSARINE_API int32_t BI_GetRGBColBottomup(BI_Bitmap *bitmap, int32_t x, int32_t y, int32_t count,
+                                           uint8_t *r, uint8_t *g, uint8_t *b);
+TESSARINE_API int32_t BI_UnpackGColTopdown(uint8_t imageType, uint8_t colorModel,
+                                           uint8_t bitsPerPixel, MEM_Handle table, int32_t stride,
+                                           const uint8_t *first, int32_t x, int32_t count,
+                                           uint8_t *out);
+TESSARINE_API int32_t BI_UnpackGColBottomup(uint8_t imageType, uint8_t colorModel,
+                                            uint8_t bitsPerPixel, MEM_Handle table, int32_t stride,
+                                            const uint8_t *first, int32_t x, int32_t count,
+                                            uint8_t *out);
+TESSARINE_API int32_t BI_GetGColTopdown(BI_Bitmap *bitmap, int32_t x, int32_t y, int32_t count,
+                                        uint8_t *out);
+TESSARINE_API int32_t BI_GetGColBottomup(BI_Bitmap *bitmap, int32_t x, int32_t y, int32_t count,
+                                         uint8_t *out);
+/* Pixel (x, y) of a 1-bit bitmap in memory, given its first byte and stride:
+   operation 0 sets it, 2 flips it, and 1 clears the whole byte that holds it. */
+TESSARINE_API int32_t BI_PixelOpBWBmp(int32_t x, int32_t y, int32_t operation, int32_t stride,
+                                      uint8_t *first);
+
+/* ---- Whole bitmaps: copy, fill, conversion, DIBs ---------------------------- */
+
+/* The colour match of BI_CopyBmpToRGBTrueColor: the four profile paths in the
+   order R27_XQMatchColors takes them (the second is kept with the
+   destination), then its rendering intent and flag word, handed on as they
+   are. */
+typedef struct BI_ColorMatch {
+    AFilePath *source;
+    AFilePath *destination;
+    AFilePath *proofing;
+    AFilePath *abstractProfile;
+    int32_t intent;
+    uint32_t flags;
+} BI_ColorMatch;
+
+/* Rectangles are not clipped: they must lie inside their bitmaps. A
+   sub-bitmap number matters only for a bitmap in a tile file. */
+TESSARINE_API int32_t BI_CopyBmp(const RECT *sourceRect, BI_Bitmap *source,
+                                 const RECT *destinationRect, BI_Bitmap *destination,
+                                 uint8_t sourceSub, uint8_t destinationSub);
+/* The destination must be RGB true colour; match may be null. */
+TESSARINE_API int32_t BI_CopyBmpToRGBTrueColor(const RECT *sourceRect, BI_Bitmap *source,
+                                               const RECT *destinationRect,
+                                               BI_Bitmap *destination, uint8_t sourceSub,
+                                               uint8_t destinationSub,
+                                               const BI_ColorMatch *match);
+TESSARINE_API int32_t BI_FillBmp(BI_Bitmap *bitmap, uint8_t r, uint8_t g, uint8_t b);
+TESSARINE_API int32_t BI_ConvertBmpToMem(BI_Bitmap *bitmap);
+TESSARINE_API int32_t BI_ConvertBmpToTiledFile(BI_Bitmap *bitmap);
+/* One pointer block, freed with MEM_FreePtr: the header, the palette (blue,
+   green, red, 0 for each colour), then room for the pixels, not cleared. */
+TESSARINE_API int32_t BI_CreateDIB(uint8_t bitsPerPixel, int32_t width, int32_t height,
+                                   int32_t count, const uint8_t *colors, BITMAPINFOHEADER **out);
+TESSARINE_API int32_t BI_CreateDIBFromBmp(const BI_Bitmap *bitmap, const RECT *rect,
+                                          BITMAPINFOHEADER **out);
+
 TESSARINE_END_C
 
 #endif

@@ -262,6 +262,27 @@ TESSARINE_API int32_t HVT_RotatedTileFileColIOBegin(uint8_t flags, BI_Bitmap *bi
                                                     int32_t budget);
 TESSARINE_API void HVT_TileFileRowColIOEnd(BI_Bitmap *bitmap);
 
+/* ---- Low-resolution levels ---------------------------------------------------- */
+
+/* A progress object of the caller's. report is the first operation of its
+   table and is called with the object itself; a non-zero answer asks the job
+   to stop. start and end are the values at the beginning and the end of the
+   job; a job puts them back as it found them. */
+struct HVT_Progress;
+typedef struct HVT_ProgressOps {
+    int32_t (*report)(struct HVT_Progress *self, double value);
+} HVT_ProgressOps;
+typedef struct HVT_Progress {
+    const HVT_ProgressOps *ops;
+    double start;
+    double end;
+} HVT_Progress;
+
+/* Fills sub-bitmap `destination` of an open tile file from `source`: point
+   sampling for 1-bit and indexed files, box averaging for the others. */
+TESSARINE_API int32_t HVT_UpdateLowRes(HVT_FileInfo *info, uint8_t source, uint8_t destination,
+                                       HVT_Progress *progress);
+
 TESSARINE_END_C
 
 #endif

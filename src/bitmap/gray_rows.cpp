@@ -6,6 +6,7 @@
 #include <cstring>
 
 #include "bitmap/color_tables.h"
+#include "bitmap/gray_rows.h"
 #include "bitmap/padded_rows.h"
 #include "bitmap/row_pack.h"
 #include "bitmap/row_steps.h"
@@ -35,60 +36,74 @@ int64_t GrayBytes(const BI_Bitmap *b, int32_t x, int32_t count) {
 
 }  // namespace
 
+namespace tessarine::bitmap {
+
+int32_t GrayValueLut(uint8_t imageType, uint8_t d, MEM_Handle table, uint8_t (&lut)[256],
+                     int *depth) {
+    switch (imageType) {
+        case 1:
+        case 2:
+            if (imageType == 1 || d == 1) {
+                lut[0] = 0;
+                lut[1] = 255;
+                *depth = 1;
+            } else if (d == 4) {
+                for (int i = 0; i < 16; ++i) lut[i] = static_cast<uint8_t>(i * 17);
+                *depth = 4;
+            } else if (d == 8) {
+                for (int i = 0; i < 256; ++i) lut[i] = static_cast<uint8_t>(i);
+                *depth = 8;
+            } else {
+                return kErrUnsupported;
+            }
+            return kOk;
+        case 3: {
+            if (d != 1 && d != 4 && d != 8) {
+                if (table != nullptr) MEM_Lock(table);  // left locked, as in the RGB unpacking
+                return kErrUnsupported;
+            }
+            // Entries are read as 3 bytes whatever the model.
+            const TableView t(table);
+            for (int i = 0; i < (1 << d); ++i)
+                lut[i] = GrayOf(t.At(3 * i), t.At(3 * i + 1), t.At(3 * i + 2));
+            *depth = d;
+            return kOk;
+        }
+        case 4: *depth = 0; return kOk;
+        default: return kErrUnsupported;
+    }
+}
+
+}  // namespace tessarine::bitmap
+
 extern "C" {
 
 TESSARINE_API int32_t BI_UnpackGRow(uint8_t imageType, uint8_t colorModel, uint8_t bitsPerPixel,
                                     MEM_Handle table, const uint8_t *src, int32_t x, int32_t count,
                                     uint8_t *out) {
     if (count < 1) return kOk;
-    const int d = bitsPerPixel;
     uint8_t lut[256];
-    switch (imageType) {
-        case 1:
-        case 2:
-            if (imageType == 1 || d == 1) {
-                bm::ForEachValueChunk(1, src, x, count, [&](const uint8_t *v, int64_t n, int64_t done) {
-                    for (int64_t i = 0; i < n; ++i) out[done + i] = static_cast<uint8_t>(-v[i]);
-                });
-                return kOk;
-            }
-            if (d == 4) {
-                for (int i = 0; i < 16; ++i) lut[i] = static_cast<uint8_t>(i * 17);
-                ThroughLut(4, src, x, count, lut, out);
-                return kOk;
-            }
-            if (d == 8) {
-                std::memcpy(out, src, static_cast<size_t>(count));
-                return kOk;
-            }
-            return kErrUnsupported;
-        case 3: {
-            if (d != 1 && d != 4 && d != 8) {
-                if (table != nullptr) MEM_Lock(table);  // left locked, as in the RGB unpacking
-                return kErrUnsupported;
-            }
-            {
-                // Entries are read as 3 bytes whatever the model.
-                const bm::TableView t(table);
-                for (int i = 0; i < (1 << d); ++i)
-                    lut[i] = bm::GrayOf(t.At(3 * i), t.At(3 * i + 1), t.At(3 * i + 2));
-            }
-            ThroughLut(d, src, x, count, lut, out);
-            return kOk;
-        }
-        case 4:
-            if (colorModel == 1) {
-                for (int64_t i = 0; i < count; ++i, src += 3) out[i] = bm::GrayOf(src[0], src[1], src[2]);
-                return kOk;
-            }
-            if (colorModel == 2) {
-                for (int64_t i = 0; i < count; ++i, src += 4)
-                    out[i] = bm::GrayOfCmyk(src[0], src[1], src[2], src[3]);
-                return kOk;
-            }
-            return kErrUnsupported;
-        default: return kErrUnsupported;
+    int depth = 0;
+    const int32_t status = bm::GrayValueLut(imageType, bitsPerPixel, table, lut, &depth);
+    if (status != kOk) return status;
+    if (depth == 8 && imageType == 2) {
+        std::memcpy(out, src, static_cast<size_t>(count));
+        return kOk;
     }
+    if (depth != 0) {
+        ThroughLut(depth, src, x, count, lut, out);
+        return kOk;
+    }
+    if (colorModel == 1) {
+        for (int64_t i = 0; i < count; ++i, src += 3) out[i] = bm::GrayOf(src[0], src[1], src[2]);
+        return kOk;
+    }
+    if (colorModel == 2) {
+        for (int64_t i = 0; i < count; ++i, src += 4)
+            out[i] = bm::GrayOfCmyk(src[0], src[1], src[2], src[3]);
+        return kOk;
+    }
+    return kErrUnsupported;
 }
 
 TESSARINE_API int32_t BI_PackGRow(uint8_t bitsPerPixel, const uint8_t *values, int8_t x,

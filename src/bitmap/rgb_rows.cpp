@@ -30,7 +30,7 @@ struct RgbOut {
     uint8_t *p2;
 };
 
-using Lut = uint8_t[3][256];
+using Lut = bm::RgbLut;
 
 void EmitThroughLut(const RgbOut &o, const uint8_t *v, int64_t n, int64_t done, const Lut &lut) {
     const uint8_t *l0 = lut[0], *l1 = lut[1], *l2 = lut[2];
@@ -70,42 +70,16 @@ void EmitTrueColour(const RgbOut &o, const uint8_t *s, int64_t n) {
     bm::SplitRgb(s, n, o.p0, o.p1, o.p2);
 }
 
-void FillGrayLut(Lut &lut, int n, uint8_t (*level)(int)) {
-    for (int i = 0; i < n; ++i) lut[0][i] = lut[1][i] = lut[2][i] = level(i);
-}
-
 int32_t UnpackRgb(uint8_t type, uint8_t d, MEM_Handle table, const uint8_t *src, int32_t x,
                   int32_t count, const RgbOut &o) {
     if (count < 1) return kOk;
     Lut lut;
-    int depth = d;
-    switch (type) {
-        case 1: depth = 1; [[fallthrough]];
-        case 2:
-            if (depth == 1)
-                FillGrayLut(lut, 2, [](int i) -> uint8_t { return i ? 0 : 255; });
-            else if (depth == 4)
-                FillGrayLut(lut, 16, [](int i) -> uint8_t {
-                    const auto v = static_cast<uint8_t>(i << 4);
-                    return v == 0 ? 255 : static_cast<uint8_t>(~v);
-                });
-            else if (depth == 8)
-                FillGrayLut(lut, 256, [](int i) -> uint8_t { return static_cast<uint8_t>(255 - i); });
-            else
-                return kErrUnsupported;
-            break;
-        case 3: {
-            if (d != 1 && d != 4 && d != 8) {
-                if (table != nullptr) MEM_Lock(table);  // left locked, as it always was
-                return kErrUnsupported;
-            }
-            const bm::TableView t(table);
-            for (int i = 0; i < (1 << d); ++i)
-                for (int k = 0; k < 3; ++k) lut[k][i] = t.At(int64_t{i} * 3 + k);
-            break;
-        }
-        case 4: EmitTrueColour(o, src, count); return kOk;
-        default: return kErrUnsupported;
+    int depth = 0;
+    const int32_t status = bm::RgbValueLut(type, d, table, lut, &depth);
+    if (status != kOk) return status;
+    if (depth == 0) {
+        EmitTrueColour(o, src, count);
+        return kOk;
     }
     bm::ForEachValueChunk(depth, src, x, count, [&](const uint8_t *v, int64_t n, int64_t done) {
         EmitThroughLut(o, v, n, done, lut);
@@ -186,6 +160,48 @@ void InChunks(int64_t count, Value &&value, Pack &&pack) {
 }  // namespace
 
 namespace tessarine::bitmap {
+
+namespace {
+
+void FillGrayLut(RgbLut &lut, int n, uint8_t (*level)(int)) {
+    for (int i = 0; i < n; ++i) lut[0][i] = lut[1][i] = lut[2][i] = level(i);
+}
+
+}  // namespace
+
+int32_t RgbValueLut(uint8_t type, uint8_t d, MEM_Handle table, RgbLut &lut, int *depth) {
+    int bits = d;
+    switch (type) {
+        case 1: bits = 1; [[fallthrough]];
+        case 2:
+            if (bits == 1)
+                FillGrayLut(lut, 2, [](int i) -> uint8_t { return i ? 0 : 255; });
+            else if (bits == 4)
+                FillGrayLut(lut, 16, [](int i) -> uint8_t {
+                    const auto v = static_cast<uint8_t>(i << 4);
+                    return v == 0 ? 255 : static_cast<uint8_t>(~v);
+                });
+            else if (bits == 8)
+                FillGrayLut(lut, 256, [](int i) -> uint8_t { return static_cast<uint8_t>(255 - i); });
+            else
+                return kErrUnsupported;
+            break;
+        case 3: {
+            if (d != 1 && d != 4 && d != 8) {
+                if (table != nullptr) MEM_Lock(table);  // left locked, as it always was
+                return kErrUnsupported;
+            }
+            const TableView t(table);
+            for (int i = 0; i < (1 << d); ++i)
+                for (int k = 0; k < 3; ++k) lut[k][i] = t.At(int64_t{i} * 3 + k);
+            break;
+        }
+        case 4: bits = 0; break;
+        default: return kErrUnsupported;
+    }
+    *depth = bits;
+    return kOk;
+}
 
 int32_t BI_PackRGBRow(uint8_t imageType, uint8_t d, const uint8_t *r, const uint8_t *g,
                       const uint8_t *b, int32_t x, int32_t count, uint8_t *row, int32_t colorCount,
