@@ -142,7 +142,7 @@ Image ReadTiff(const std::string &path) {
 }
 
 Image MakeRgb(int w, int h) {
-    Image im{w, h, PNG_COLOR_TYPE_RGB, 8};
+    Image im{w, h, PNG_COLOR_TYPE_RGB, 8, 0, {}, {}};
     for (int y = 0; y < h; ++y) {
         std::vector<uint8_t> row(size_t(w) * 3);
         for (int x = 0; x < w; ++x) {
@@ -156,7 +156,7 @@ Image MakeRgb(int w, int h) {
 }
 
 Image MakeGray(int w, int h, int depth) {
-    Image im{w, h, PNG_COLOR_TYPE_GRAY, depth};
+    Image im{w, h, PNG_COLOR_TYPE_GRAY, depth, 0, {}, {}};
     const size_t bytes = (size_t(w) * depth + 7) / 8;
     for (int y = 0; y < h; ++y) {
         std::vector<uint8_t> row(bytes);
@@ -170,7 +170,7 @@ Image MakeGray(int w, int h, int depth) {
 }
 
 Image MakePalette(int w, int h, int colours) {
-    Image im{w, h, PNG_COLOR_TYPE_PALETTE, 8};
+    Image im{w, h, PNG_COLOR_TYPE_PALETTE, 8, 0, {}, {}};
     for (int i = 0; i < colours; ++i)
         im.palette.insert(im.palette.end(), {uint8_t(i * 37), uint8_t(255 - i * 11), uint8_t(i * i)});
     for (int y = 0; y < h; ++y) {

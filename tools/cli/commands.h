@@ -45,6 +45,9 @@ struct LevelsOptions {
     bool progressBar = false; // decided by the caller: standard error is a terminal
 };
 void RunLevels(const LevelsOptions &options, std::ostream &out, std::ostream &err);
+// Told every progress value of levels before the stop is looked at (tests).
+using ProgressObserver = void (*)(double value);
+void SetProgressObserver(ProgressObserver observer);
 
 struct CutOptions {
     std::string input;
