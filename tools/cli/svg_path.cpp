@@ -2,6 +2,8 @@
 
 #include <charconv>
 #include <cmath>
+#include <cstdlib>
+#include <string>
 
 namespace tessarine::cli {
 namespace {
@@ -19,13 +21,13 @@ class Scanner {
     void SkipSpace() {
         while (!AtEnd() && IsSpace(s_[i_])) ++i_;
     }
-    // White space, at most one comma, white space.
-    void SkipSeparator() {
+    // White space, at most one comma, white space. True when a comma was passed.
+    bool SkipSeparator() {
         SkipSpace();
-        if (Peek() == ',') {
-            ++i_;
-            SkipSpace();
-        }
+        if (Peek() != ',') return false;
+        ++i_;
+        SkipSpace();
+        return true;
     }
     bool StartsNumber() const {
         const char c = Peek();
@@ -57,15 +59,15 @@ class Scanner {
         }
         const char *first = s_.data() + start + (s_[start] == '+' ? 1 : 0);
         const auto result = std::from_chars(first, s_.data() + j, value);
-        if (result.ec == std::errc::result_out_of_range || !std::isfinite(value)) {
-            // Underflow is harmless: it reads as zero.
-            if (result.ec == std::errc::result_out_of_range && std::fabs(value) < 1.0) {
-                value = 0.0;
-            } else {
+        if (result.ec == std::errc::result_out_of_range) {
+            // Underflow is harmless and reads as zero; overflow is not.
+            const std::string text(first, s_.data() + j);
+            value = std::strtod(text.c_str(), nullptr);
+            if (!std::isfinite(value)) {
                 why = "number out of range";
                 return false;
             }
-        } else if (result.ec != std::errc() || result.ptr != s_.data() + j) {
+        } else if (result.ec != std::errc() || result.ptr != s_.data() + j || !std::isfinite(value)) {
             why = "bad number";
             return false;
         }
@@ -144,7 +146,9 @@ bool ParsePathData(std::string_view data, std::vector<PathCommand> &out, PathErr
             const bool ok = upper == 'A' && (k == 3 || k == 4) ? in.Flag(a[k], why) : in.Number(a[k], why);
             if (!ok) return fail(argAt, why);
         }
-        in.SkipSeparator();
+        const size_t commaAt = in.Pos();
+        if (in.SkipSeparator() && (in.AtEnd() || !in.StartsNumber()))
+            return fail(commaAt, "a number was expected after ','");
 
         PathCommand p{};
         const double ox = relative ? cx : 0, oy = relative ? cy : 0;
