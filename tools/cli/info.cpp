@@ -22,8 +22,10 @@ nlohmann::ordered_json AsJson(const TileImage &image) {
     j["imageType"] = h.imageType;
     j["bitsPerPixel"] = h.bitsPerPixel;
     j["colorModel"] = h.colorModel;
-    j["xResolution"] = h.xResolution;
-    j["yResolution"] = h.yResolution;
+    // The header is packed: its doubles are copied out before use.
+    const double xResolution = h.xResolution, yResolution = h.yResolution;
+    j["xResolution"] = xResolution;
+    j["yResolution"] = yResolution;
     j["userBytes"] = {h.userByte1, h.userByte2, h.userByte3};
     const size_t entry = h.colorModel == 2 ? 4 : 3;
     auto colors = nlohmann::ordered_json::array();
@@ -48,7 +50,8 @@ nlohmann::ordered_json AsJson(const TileImage &image) {
         subs.push_back(sj);
     }
     j["subBitmaps"] = subs;
-    j["end"] = h.subbmpOffset[h.subbmpCount];
+    const int32_t end = h.subbmpOffset[h.subbmpCount];
+    j["end"] = end;
     return j;
 }
 
@@ -58,7 +61,8 @@ void AsText(TileImage &image, std::ostream &out) {
     out << image.Path() << ": tile bitmap file, " << f.fileBytes << " bytes\n";
     out << "  layout:       " << LayoutOf(*image.Bitmap()) << " (" << ImageTypeName(h.imageType) << ", "
         << int(h.bitsPerPixel) << "-bit, " << ColorModelName(h.colorModel) << ")\n";
-    out << "  resolution:   " << h.xResolution << " x " << h.yResolution << "\n";
+    const double xResolution = h.xResolution, yResolution = h.yResolution;
+    out << "  resolution:   " << xResolution << " x " << yResolution << "\n";
     out << "  user bytes:   " << int(h.userByte1) << " " << int(h.userByte2) << " " << int(h.userByte3) << "\n";
     const size_t entry = h.colorModel == 2 ? 4 : 3;
     out << "  colour table: " << f.colors.size() / entry << " entries\n";
