@@ -4,6 +4,7 @@
 #include <tessarine/storage.h>
 
 #include "core/status.h"
+#include "platform/file_runtime.h"
 #include "storage/block_file.h"
 
 namespace tessarine::storage {
@@ -54,10 +55,10 @@ int32_t PatchLink(FM_BlockFile *file, uint32_t index, uint32_t field, uint32_t v
 }
 
 int32_t BlocksThatExist(FM_BlockFile *file, uint64_t *count) {
-    int32_t status = FM_Seek(file->descriptor, 2, 0);
-    int32_t length = 0;
-    if (!Failed(status)) status = FM_Tell(file->descriptor, &length);
-    if (Failed(status)) return status;
+    // Asked of the file itself: walks must leave the position where the
+    // reads of their steps put it.
+    const int64_t length = platform::_filelength(file->descriptor);
+    if (length < 0) return kErrFileAccess;
     uint64_t cached = 0;
     if (FM_MemBlock *head = file->cacheHead) {
         FM_MemBlock *node = head;

@@ -10,26 +10,13 @@
 
 namespace tessarine::storage {
 
-namespace {
-// Steps beyond this many blocks make a walk check that the blocks exist.
-constexpr uint64_t kStepsBeforeBoundCheck = 64;
-}  // namespace
-
 int32_t NextAddr(FM_BlockFile *file, uint32_t block, uint32_t offset, uint32_t distance,
                  FM_BlockAddr *result, BlockObserver observer, void *context) {
     const uint32_t payload = file->header.payloadSize;
     result->block = block;
     result->offset = offset + distance;
-    uint64_t steps = 0;
-    uint64_t bound = UINT64_MAX;
+    CircleWatch watch(block);
     while (result->offset >= payload) {
-        // A chain in a circle would otherwise step as far as a hostile
-        // distance reaches: no walk passes more blocks than can exist.
-        if (++steps > kStepsBeforeBoundCheck && bound == UINT64_MAX) {
-            int32_t status = BlocksThatExist(file, &bound);
-            if (Failed(status)) return status;
-        }
-        if (steps > bound) return kErrFileAccess;
         result->offset -= payload;
         FM_BlockHdr header;
         int32_t status = FM_GetFileBlockHdrByIndex(file, result->block, &header);
@@ -38,6 +25,12 @@ int32_t NextAddr(FM_BlockFile *file, uint32_t block, uint32_t offset, uint32_t d
         if (observer != nullptr) {
             status = observer(context, result->block, result->offset);
             if (status != kOk) return status;
+        }
+        // Every chain closes on itself, so a long distance goes round it:
+        // whole turns end where they began and are skipped.
+        if (const uint64_t circle = watch.Step(result->block)) {
+            const uint64_t turns = result->offset / payload / circle;
+            result->offset -= static_cast<uint32_t>(turns * circle * payload);
         }
     }
     if (result->block == file->header.endBlock && result->offset >= file->header.endOffset)
@@ -56,28 +49,33 @@ TESSARINE_API int32_t FM_NewBlock(FM_BlockFile *file, FM_MemBlock **out) {
     FM_MemBlock *node = nullptr;
     int32_t status = FM_GetFreeMemBlock(file, &node);
     if (Failed(status)) return status;
-    // As with a fetch, a node that fails keeps its old index and dirty mark,
-    // so that no dirty node ever names a slot that cannot be written.
+    // The node takes its index before the read or seek that may fail, and
+    // keeps it then; only the marks of a new block wait for success.
     FM_BlockFileHdr &h = file->header;
-    uint32_t index = 0;
     if (h.freeHead != 0) {
-        index = h.freeHead;
+        node->index = h.freeHead;
         int32_t offset = 0;
         uint8_t bytes[4];
         status = SlotOffset(file, h.freeHead, kNextField, &offset);
         if (!Failed(status)) status = FM_SeekAndRead(file->descriptor, offset, 0, bytes, 4);
-        if (Failed(status)) return status;
-        h.freeHead = GetU32(bytes);
+        if (!Failed(status)) h.freeHead = GetU32(bytes);
     } else {
-        index = h.nextIndex;
+        node->index = h.nextIndex;
         ++h.nextIndex;
         // The slot after the new block, counted without wrapping round.
-        const uint64_t after = (uint64_t(index) + 1) * h.stride;
-        if (after > uint64_t(INT32_MAX)) return kErrFileAccess;
-        status = FM_Seek(file->descriptor, 0, static_cast<int32_t>(after));
-        if (Failed(status)) return status;
+        const uint64_t after = (uint64_t(node->index) + 1) * h.stride;
+        status = after > uint64_t(INT32_MAX)
+                     ? kErrFileAccess
+                     : FM_Seek(file->descriptor, 0, static_cast<int32_t>(after));
     }
-    node->index = index;
+    if (Failed(status)) {
+        // A damaged header can name a slot that no file offset reaches: a
+        // dirty node there could never be written back, and would hold up
+        // the close and every later eviction.
+        int32_t offset = 0;
+        if (Failed(SlotOffset(file, node->index, 0, &offset))) node->dirty = 0;
+        return status;
+    }
     node->dirty = 1;
     SetNodeWord(node, kNextField, 0);
     SetNodeWord(node, kPrevField, 0);

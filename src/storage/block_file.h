@@ -60,9 +60,39 @@ int32_t ReadLink(FM_BlockFile *file, uint32_t index, uint32_t field, uint32_t *v
 // write at the block's slot.
 int32_t PatchLink(FM_BlockFile *file, uint32_t index, uint32_t field, uint32_t value);
 
-// Blocks that can exist: the slots the file holds plus the cached ones.
-// Bounds walks over hostile files.
+// Blocks that can exist: the slots the file holds plus the cached ones. The
+// file position does not move.
 int32_t BlocksThatExist(FM_BlockFile *file, uint64_t *count);
+
+// Watches a walk whose every step follows from where it stands (a chain of
+// blocks, a run of tags): once it stands where it stood before it goes round
+// for ever. Points are saved at doubling distances, so a circle is seen
+// within a few turns of entering it, with no memory of the walk.
+class CircleWatch {
+  public:
+    explicit CircleWatch(uint64_t start) : saved_(start) {}
+    // After each step: the circle's length once the walk is back at the
+    // saved point, else 0.
+    uint64_t Step(uint64_t now) {
+        ++since_;
+        if (now == saved_) return since_;
+        if (since_ == span_) {
+            saved_ = now;
+            span_ *= 2;
+            since_ = 0;
+        }
+        return 0;
+    }
+
+  private:
+    uint64_t saved_;
+    uint64_t since_ = 0;
+    uint64_t span_ = 1;
+};
+
+inline uint64_t AddrKey(FM_BlockAddr at) {
+    return uint64_t(at.block) << 32 | at.offset;
+}
 
 // A temporary block of the heap, released on every way out.
 class ScratchBlock {
@@ -85,7 +115,8 @@ int32_t FM_GetFreeMemBlock(FM_BlockFile *file, FM_MemBlock **node);
 
 // FM_GetNextAddr with an observer of every block stepped into; the observer
 // returns a status: a failure stops the step with it, kStopWalk stops it with
-// the result half-way and is handed back as it is.
+// the result half-way and is handed back as it is. Whole turns round a chain
+// that has come back on itself are skipped, observer and all.
 inline constexpr int32_t kStopWalk = 1;
 using BlockObserver = int32_t (*)(void *context, uint32_t block, uint32_t offsetLeft);
 int32_t NextAddr(FM_BlockFile *file, uint32_t block, uint32_t offset, uint32_t distance,

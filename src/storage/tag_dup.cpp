@@ -5,6 +5,7 @@
 
 #include "core/status.h"
 #include "storage/block_file.h"
+#include "storage/tag_stream.h"
 
 namespace {
 
@@ -27,20 +28,24 @@ struct Passed {
     ~Passed() {
         if (bits != nullptr) MEM_FreeHdl(bits);
     }
-    int32_t Make(FM_BlockFile *file) {
-        int32_t status = BlocksThatExist(file, &count);
-        if (Failed(status)) return status;
+    int32_t Make(uint64_t blocks) {
+        count = blocks;
         bits = static_cast<uint8_t *>(MEM_AllocPtr(MEM_FLAG_ZERO, uint32_t(count / 8 + 1)));
         return bits == nullptr ? kErrMemory : kOk;
     }
-    bool Seen(uint32_t block) const { return (bits[block / 8] >> (block % 8)) & 1; }
-    void Mark(uint32_t block) { bits[block / 8] |= uint8_t(1u << (block % 8)); }
+    // A block the file does not hold is never passed: the walk's own read of
+    // it fails.
+    bool Seen(uint32_t block) const {
+        return block < count && ((bits[block / 8] >> (block % 8)) & 1);
+    }
+    void Mark(uint32_t block) {
+        if (block < count) bits[block / 8] |= uint8_t(1u << (block % 8));
+    }
 
     static int32_t Step(void *context, uint32_t block, uint32_t) {
         auto *self = static_cast<Passed *>(context);
         // A next of 0 ends the chain: no tag follows.
         if (block == 0) return kOk;
-        if (block >= self->count) return kErrFileAccess;
         if (self->Seen(block)) {
             self->revisit = true;
             return kStopWalk;
@@ -68,52 +73,61 @@ int32_t CopyData(FM_BlockFile *source, FM_BlockAddr from, FM_BlockFile *destinat
     return kOk;
 }
 
+// Appends a live tag to the destination and copies its data; the data lies
+// 8 bytes on from each tag's address.
+int32_t CopyLiveTag(FM_BlockFile *source, FM_BlockAddr at, const FM_TagHdr &header,
+                    FM_BlockFile *destination, uint8_t *buffer) {
+    FM_BlockAddr tag;
+    int32_t status = FM_TagAppendHdrAtEnd(destination, &header, &tag, nullptr);
+    if (Failed(status) || header.length == FM_TAG_HDR_BYTES) return status;
+    FM_BlockAddr from;
+    FM_BlockAddr to;
+    status = FM_GetNextAddr(source, at.block, at.offset, FM_TAG_HDR_BYTES, &from);
+    if (!Failed(status))
+        status = FM_GetNextAddr(destination, tag.block, tag.offset, FM_TAG_HDR_BYTES, &to);
+    if (Failed(status)) return status;
+    return CopyData(source, from, destination, to, header.length - FM_TAG_HDR_BYTES, buffer);
+}
+
+// Each tag is handled before the walk steps on from it, so a tag whose data
+// runs off the chain is appended and fails in its copy.
 int32_t CopyLiveTags(FM_BlockFile *source, FM_BlockFile *destination, uint8_t *buffer) {
     const FM_BlockFileHdr &h = source->header;
     if (h.firstBlock == 0 || (h.firstBlock == h.endBlock && h.endOffset == 0)) return kOk;
-    Passed passed;
-    int32_t status = passed.Make(source);
+    uint64_t blocks = 0;
+    int32_t status = BlocksThatExist(source, &blocks);
     if (Failed(status)) return status;
-    if (h.firstBlock >= passed.count) return kErrFileAccess;
-    passed.Mark(h.firstBlock);
+    Passed passed;
+    const bool fullLastBlock = h.endBlock == 0;
+    if (fullLastBlock) {
+        status = passed.Make(blocks);
+        if (Failed(status)) return status;
+        passed.Mark(h.firstBlock);
+    }
 
     FM_BlockAddr at = {h.firstBlock, 0};
+    // Tags that lead back to one the walk has passed would be copied for ever.
+    CircleWatch watch(AddrKey(at));
     while (at.block != 0) {
         FM_TagHdr header;
         status = FM_TagReadHdr(source, at.block, at.offset, &header, nullptr, nullptr);
         if (Failed(status)) return status;
-        // A tag longer than the file can hold would make the copy grow
-        // without end (its length may even wrap round the offset).
-        if (header.length < FM_TAG_HDR_BYTES ||
-            uint64_t(header.length) > passed.count * uint64_t(h.payloadSize))
-            return kErrFileAccess;
-        FM_BlockAddr next;
-        status = NextAddr(source, at.block, at.offset, header.length, &next, Passed::Step, &passed);
-        if (Failed(status)) return status;
-        if (passed.revisit) {
-            // Only a stream that fills its last block ends this way; with an
-            // end position the chain runs in a circle that misses it.
-            if (h.endBlock != 0) return kErrFileAccess;
-            next.block = 0;
-        }
-        if (header.kind != 0) {
-            FM_BlockAddr tag;
-            status = FM_TagAppendHdrAtEnd(destination, &header, &tag, nullptr);
+        if (header.kind != kFreeTag) {
+            // A tag longer than the file can hold would make the copy grow
+            // without end; one shorter than its header has a data count that
+            // wraps round.
+            if (header.length < FM_TAG_HDR_BYTES ||
+                uint64_t(header.length) > blocks * uint64_t(h.payloadSize))
+                return kErrFileAccess;
+            status = CopyLiveTag(source, at, header, destination, buffer);
             if (Failed(status)) return status;
-            if (header.length > FM_TAG_HDR_BYTES) {
-                // The data lies 8 bytes on from each tag's address.
-                FM_BlockAddr from;
-                FM_BlockAddr to;
-                status = FM_GetNextAddr(source, at.block, at.offset, FM_TAG_HDR_BYTES, &from);
-                if (!Failed(status))
-                    status =
-                        FM_GetNextAddr(destination, tag.block, tag.offset, FM_TAG_HDR_BYTES, &to);
-                if (!Failed(status))
-                    status = CopyData(source, from, destination, to,
-                                      header.length - FM_TAG_HDR_BYTES, buffer);
-                if (Failed(status)) return status;
-            }
         }
+        FM_BlockAddr next;
+        status = NextAddr(source, at.block, at.offset, header.length, &next,
+                          fullLastBlock ? Passed::Step : nullptr, &passed);
+        if (Failed(status)) return status;
+        if (passed.revisit) next.block = 0;
+        if (next.block != 0 && watch.Step(AddrKey(next)) != 0) return kErrFileAccess;
         at = next;
     }
     return kOk;

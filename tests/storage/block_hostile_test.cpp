@@ -90,15 +90,21 @@ TEST_F(BlockHostileTest, ZeroLengthTagIsRefusedByWalks) {
     EXPECT_EQ(StatusOf(Dup()), -50);
 }
 
-TEST_F(BlockHostileTest, LengthRunningPastTheFileGivesAStatus) {
+// Walks go round the one-block circle as far as the length reaches; only the
+// copy refuses a live tag longer than the file holds.
+TEST_F(BlockHostileTest, LengthRunningPastTheFile) {
     auto bytes = Header(P, S, 2, 1, 30);
     PutBlock(bytes, 1, 1, {{1, 0x7FFFFFF0u}});
     FM_BlockFile *f = Open(bytes);
     FM_TagHdr h{};
     FM_BlockAddr next{};
-    EXPECT_EQ(StatusOf(FM_TagReadHdr(f, 1, 0, &h, nullptr, &next)), -50);
+    EXPECT_EQ(StatusOf(FM_TagReadHdr(f, 1, 0, &h, nullptr, &next)), 10);
+    EXPECT_EQ(next, (FM_BlockAddr{0, 0x7FFFFFF0u % P}));  // at or past the end position
     FM_BlockAddr at = {1, 0};
-    EXPECT_EQ(StatusOf(FM_TagDelete(f, &at, nullptr)), -50);
+    EXPECT_EQ(StatusOf(FM_TagDelete(f, &at, &next)), 10);
+    EXPECT_EQ(next, (FM_BlockAddr{0, 0x7FFFFFF0u % P}));
+    EXPECT_EQ(f->header.endBlock, 0u);  // the only tag, at offset 0: its block is freed
+    EXPECT_EQ(f->header.freeHead, 1u);
     FM_BlockFileClose(&f);
     EXPECT_EQ(StatusOf(Dup()), -50);
 }
@@ -190,6 +196,34 @@ TEST_F(BlockHostileTest, HugeFreeHeadOrNextIndexGivesAStatus) {
     EXPECT_EQ(StatusOf(FM_NewBlock(f, &node)), -50);
     FM_TagHdr t = Tag(1, 100);
     EXPECT_EQ(StatusOf(FM_TagAppendHdrAtEnd(f, &t, nullptr, nullptr)), -50);
+    EXPECT_EQ(StatusOf(FM_BlockFileClose(&f)), 10);
+}
+
+// A free tag as long as a damaged file can make it, in a block that points at
+// itself and heads a free list that does too: the room it gives would have
+// the block freed again and again, tens of millions of times.
+TEST_F(BlockHostileTest, RoomThatWouldFreeOneBlockOverAndOver) {
+    auto bytes = Header(P, S, 2, 1, 10);
+    PutLe32(bytes, 24, 1);  // freeHead
+    PutBlock(bytes, 1, 1, {{0, 0x7FFFFFF0u}});
+    FM_BlockFile *f = Open(bytes);
+    FM_TagHdr t = Tag(1, 16);
+    EXPECT_EQ(StatusOf(FM_TagInsertHdrAt(f, 1, 0, &t, nullptr, nullptr, nullptr)), -50);
+    FM_BlockFileClose(&f);
+}
+
+// A dirty node recycled for a free head that no file offset reaches takes
+// that index but not the write-back: the close still succeeds and frees all.
+TEST_F(BlockHostileTest, RecycledDirtyNodeForAnUnreachableFreeHead) {
+    auto bytes = Header(P, S, 2, 1, 10);
+    PutBlock(bytes, 1, 1, {{1, 10}});
+    FM_BlockFile *f = Open(bytes);
+    FM_MemBlock *node = nullptr;
+    for (int i = 0; i < 5; ++i) ASSERT_EQ(StatusOf(FM_NewBlock(f, &node)), 10);
+    f->header.freeHead = 0x7FFFFFFF;
+    EXPECT_EQ(StatusOf(FM_NewBlock(f, &node)), -50);
+    EXPECT_EQ(f->cacheHead->index, 0x7FFFFFFFu);
+    EXPECT_EQ(f->cacheHead->dirty, 0u);
     EXPECT_EQ(StatusOf(FM_BlockFileClose(&f)), 10);
 }
 

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cstring>
 #include <list>
+#include <map>
 #include <random>
 #include <sstream>
 #include <string>
@@ -30,6 +31,20 @@ void Put32(uint8_t *p, uint32_t v) {
 }
 
 // ---- the model -------------------------------------------------------------
+
+// The library's guard on walks of tags that would go round for ever: the walk
+// is stopped once it stands on a point saved at doubling distances. Kept the
+// same here so that the reads made before it stops match.
+struct Circle {
+    Addr saved;
+    uint64_t since = 0, span = 1;
+    bool Back(Addr now) {
+        ++since;
+        if (now.block == saved.block && now.offset == saved.offset) return true;
+        if (since == span) saved = now, span *= 2, since = 0;
+        return false;
+    }
+};
 
 struct Calls {
     std::vector<std::pair<Addr, Addr>> list;
@@ -131,17 +146,20 @@ class Model {
         Node *n = nullptr;
         int32_t s = FreeNode(&n);
         if (s < 0) return s;
-        uint32_t index = h.freeHead;
+        // The index is the node's before the read or seek that may fail.
+        n->index = h.freeHead;
         if (h.freeHead != 0) {
             uint8_t b[4];
             s = Read(uint64_t(h.freeHead) * S, b, 4);
-            if (s < 0) return s;
-            h.freeHead = Get32(b);
+            if (s >= 0) h.freeHead = Get32(b);
         } else {
-            index = h.nextIndex++;
-            if ((uint64_t(index) + 1) * S > uint64_t(INT32_MAX)) return -50;
+            n->index = h.nextIndex++;
+            if ((uint64_t(n->index) + 1) * S > uint64_t(INT32_MAX)) s = -50;
         }
-        n->index = index;
+        if (s < 0) {
+            if (uint64_t(n->index) * S > uint64_t(INT32_MAX)) n->dirty = 0;
+            return s;
+        }
         n->dirty = 1;
         Put32(n->img.data(), 0);
         Put32(n->img.data() + 4, 0);
@@ -205,14 +223,21 @@ class Model {
     int32_t NextAddr(uint32_t block, uint32_t offset, uint32_t distance, Addr *r) {
         r->block = block;
         r->offset = offset + distance;
+        // Every chain is a ring: once a block comes back, whole turns are
+        // skipped. The step at which the walk first stood on each block:
+        std::map<uint32_t, uint64_t> first = {{block, 0}};
         uint64_t steps = 0;
         while (r->offset >= P) {
-            if (++steps > 64 && steps > disk.size() / S + 1 + cache.size()) return -50;
             r->offset -= P;
             uint32_t next = 0;
             int32_t s = Word(r->block, 0, &next);
             if (s < 0) return s;
             r->block = next;
+            auto [it, fresh] = first.emplace(next, ++steps);
+            if (!fresh) {
+                const uint64_t circle = steps - it->second;
+                r->offset -= uint32_t(r->offset / P / circle * circle * P);
+            }
         }
         if (r->block == h.endBlock && r->offset >= h.endOffset) r->block = 0;
         return 10;
@@ -283,13 +308,6 @@ class Model {
         if (s >= 0 && tag) *tag = at;
         return s;
     }
-    int32_t Passed(uint64_t &walked, uint32_t length) {
-        if (length < 8) return -50;
-        walked += length;
-        if (walked > 64ull * P && walked > (disk.size() / S + 1 + cache.size()) * uint64_t(P))
-            return -50;
-        return 10;
-    }
     int32_t Insert(uint32_t block, uint32_t offset, FM_TagHdr *t, Addr *tag, Addr *data,
                    Addr *next) {
         if (block == 0 || (block == h.endBlock && offset == h.endOffset))
@@ -300,11 +318,11 @@ class Model {
         if (s < 0) return s;
         uint32_t room = 0;
         if (found.kind == 0) {
-            uint64_t walked = 0;
+            Circle circle{{block, offset}};
             for (;;) {
-                if ((s = Passed(walked, found.length)) < 0) return s;
                 room += found.length;
                 if (follow.block == 0) break;
+                if (circle.Back(follow)) return -50;
                 Addr after{};
                 if ((s = ReadTag(follow.block, follow.offset, &found, nullptr, &after)) < 0)
                     return s;
@@ -350,6 +368,7 @@ class Model {
                 if (s < 0) return s;
                 if (!callback_) return -6;
                 Addr at = follow;
+                Circle circle{at};
                 while (at.block == block) {
                     Addr from = at, to = {last, at.offset};
                     calls_->list.push_back({from, to});
@@ -357,7 +376,7 @@ class Model {
                     FM_TagHdr x{};
                     Addr nx{};
                     if ((s = ReadTag(at.block, at.offset, &x, nullptr, &nx)) < 0) return s;
-                    if (nx.block == block && nx.offset <= at.offset) return -50;
+                    if (nx.block == block && circle.Back(nx)) return -50;
                     at = nx;
                 }
                 if (h.endBlock == block) h.endBlock = last;
@@ -403,14 +422,13 @@ class Model {
         int32_t s = ReadTag(at.block, at.offset, &t, nullptr, &follow);
         if (s < 0) return s;
         uint32_t size = t.length;
-        uint64_t walked = 0;
-        if ((s = Passed(walked, t.length)) < 0) return s;
+        Circle circle{at};
         while (follow.block != 0) {
+            if (circle.Back(follow)) return -50;
             FM_TagHdr f{};
             Addr after{};
             if ((s = ReadTag(follow.block, follow.offset, &f, nullptr, &after)) < 0) return s;
             if (f.kind != 0) break;
-            if ((s = Passed(walked, f.length)) < 0) return s;
             size += f.length;
             follow = after;
         }
