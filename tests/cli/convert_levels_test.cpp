@@ -162,12 +162,12 @@ void LibraryLevels(const std::string &path, int count) {
 
 TEST_F(ConvertLevels, LevelsAreTheLibrarys) {
     for (const char *layout : {"rgb", "bw", "indexed", "gray4"}) {
-        const std::string tile = Imported(std::string(layout) + ".tsr", MakeRgb(2100, 1500), layout);
+        const std::string tile = Imported(std::string(layout) + ".tsr", MakeRgb(1030, 1030), layout);
         const std::string twin = Copy(tile, Made(std::string(layout) + "-twin.tsr"));
         const RunResult r = Cli({"levels", tile, "--count", "3", "-q"});
         ASSERT_EQ(r.code, 0) << r.err;
         EXPECT_TRUE(r.err.empty());
-        EXPECT_NE(r.out.find("3 levels added, now 4 sub-bitmaps: 2100x1500 1050x750 525x375 262x187"),
+        EXPECT_NE(r.out.find("3 levels added, now 4 sub-bitmaps: 1030x1030 515x515 257x257 128x128"),
                   std::string::npos) << r.out;
         LibraryLevels(twin, 3);
         EXPECT_TRUE(ReadFile(tile) == ReadFile(twin)) << layout;
@@ -194,7 +194,7 @@ void StopPast(double value) {
 }
 
 TEST_F(ConvertLevels, InterruptedLevelsLeaveAValidFile) {
-    const std::string tile = Imported("i.tsr", MakeRgb(2000, 2000), "rgb");
+    const std::string tile = Imported("i.tsr", MakeRgb(1200, 1200), "rgb");
     const std::string oneLevel = Copy(tile, Made("one.tsr"));
     ASSERT_EQ(Cli({"levels", oneLevel, "--count", "1"}).code, 0);
     // Three levels weigh 16 : 4 : 1; past 0.8 the second one is under way.

@@ -9,6 +9,7 @@
 #include "failure.h"
 #include "output_file.h"
 #include "raster.h"
+#include "row_pipeline.h"
 #include "tile_image.h"
 
 namespace tessarine::cli {
@@ -94,7 +95,7 @@ void RunExport(const ExportOptions &options, std::ostream &out) {
     }
 
     PendingOutput pending(options.output);
-    auto writer = CreateRaster(type, pending.TempPath(), options.output, f);
+    auto writer = WriteBehind(CreateRaster(type, pending.TempPath(), options.output, f), RowBytes(f) + 8);
     // A colour match costs a transform each call: rows go to it in batches.
     const bool batched = b->imageType == 4 && cmyk && !options.tiffCmyk && toRgb.UsesProfiles();
     const size_t batchRows = batched ? std::max<size_t>(1, (size_t(4) << 20) / (w * 4)) : 1;

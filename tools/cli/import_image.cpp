@@ -8,6 +8,7 @@
 #include "commands.h"
 #include "failure.h"
 #include "raster.h"
+#include "row_pipeline.h"
 #include "tile_image.h"
 
 namespace tessarine::cli {
@@ -186,7 +187,7 @@ class RowImporter {
 }  // namespace
 
 void RunImport(const ImportOptions &options, std::ostream &out) {
-    auto reader = OpenRaster(options.input);
+    auto reader = ReadAhead(OpenRaster(options.input));
     const RasterFormat &f = reader->Format();
     const Layout &layout = options.layout.empty() ? DefaultLayout(f) : LayoutNamed(options.layout);
     const std::vector<uint8_t> table = layout.imageType == 3 ? TableFor(f) : std::vector<uint8_t>{};
