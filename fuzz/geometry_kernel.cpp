@@ -7,20 +7,11 @@
 
 #include <tessarine/geometry.h>
 
+#include "double_reader.h"
+
 namespace {
 
-struct Reader {
-    const uint8_t *data;
-    size_t size;
-    double Next() {
-        double v = 0;
-        if (size >= sizeof v) {
-            std::memcpy(&v, data, sizeof v);
-            data += sizeof v;
-            size -= sizeof v;
-        }
-        return v;
-    }
+struct Reader : DoubleReader {
     BZ_Point Point() { return BZ_Point{Next(), Next()}; }
     BZ_Arc Arc() {
         BZ_Arc a;
@@ -37,7 +28,7 @@ struct Reader {
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
-    Reader in{data, size};
+    Reader in{{data, size}};
     const BZ_Line line{in.Point(), in.Point()};
     BZ_Arc a = in.Arc();
     BZ_Arc b = in.Arc();

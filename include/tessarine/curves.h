@@ -70,7 +70,9 @@ TESSARINE_API int32_t NewLineSegSegIntersect(double x0, double y0, double x1, do
                                              int16_t allowOverlap, double *tA, double *tB,
                                              BZ_Point *pts, uint16_t *count, double tol,
                                              int16_t *kind);
-/* Curves are eight doubles each: x0, y0, x1, y1, x2, y2, x3, y3. */
+/* Curves are eight doubles each: x0, y0, x1, y1, x2, y2, x3, y3. A pair
+   whose pieces never separate (a tolerance at or below the rounding of the
+   coordinates, values that are not numbers) ends with -56. */
 TESSARINE_API int32_t NewCurveCurveIntersect(const double *curveA, const double *curveB,
                                              double *tA, double *tB, BZ_Point *pts,
                                              uint16_t *count, double tol, int16_t *kind);

@@ -2,6 +2,8 @@
 // and copy through a map table.
 #include "bitmap/block_movers.h"
 
+#include <cstring>
+
 #include <tessarine/bitmap.h>
 #include <tessarine/core.h>
 
@@ -65,27 +67,35 @@ int32_t DirectCopyBits(int d, const PixelArea &src, const RECT &rect, const Pixe
 
 namespace {
 
-// Whole pixels of 1, 3 or 4 bytes under the set bits of the mask, high bit
-// first from `phase`. Zero mask bytes after the first skip eight pixels.
-void MaskWholePixels(int bytesPer, const uint8_t *s, const uint8_t *m, int phase, int64_t count,
-                     uint8_t *t) {
+// Whole pixels of N bytes under the set bits of the mask, high bit first
+// from `phase`. Zero mask bytes after the first skip eight pixels.
+template <int N>
+void MaskWholePixels(const uint8_t *s, const uint8_t *m, int phase, int64_t count, uint8_t *t) {
     int64_t done = 0;
     if (phase != 0) {
         const unsigned b = *m++;
-        for (int j = phase; j < 8 && done < count; ++j, ++done, s += bytesPer, t += bytesPer)
-            if (b & (0x80u >> j)) std::memcpy(t, s, static_cast<size_t>(bytesPer));
+        for (int j = phase; j < 8 && done < count; ++j, ++done, s += N, t += N)
+            if (b & (0x80u >> j)) std::memcpy(t, s, N);
     }
     while (done < count) {
         const unsigned b = *m++;
-        if (b == 0) {
-            done += 8;
-            s += 8 * bytesPer;
-            t += 8 * bytesPer;
-            continue;
+        if (b == 0xFF && count - done >= 8) {
+            std::memcpy(t, s, 8 * N);
+        } else if (b != 0) {
+            for (int j = 0; j < 8 && done + j < count; ++j)
+                if (b & (0x80u >> j)) std::memcpy(t + j * N, s + j * N, N);
         }
-        for (int j = 0; j < 8 && done < count; ++j, ++done, s += bytesPer, t += bytesPer)
-            if (b & (0x80u >> j)) std::memcpy(t, s, static_cast<size_t>(bytesPer));
+        done += 8;
+        s += 8 * N;
+        t += 8 * N;
     }
+}
+
+void MaskWholePixels(int bytesPer, const uint8_t *s, const uint8_t *m, int phase, int64_t count,
+                     uint8_t *t) {
+    if (bytesPer == 1) MaskWholePixels<1>(s, m, phase, count, t);
+    else if (bytesPer == 3) MaskWholePixels<3>(s, m, phase, count, t);
+    else MaskWholePixels<4>(s, m, phase, count, t);
 }
 
 }  // namespace

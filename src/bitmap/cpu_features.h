@@ -1,37 +1,43 @@
-// Which vector paths this processor can take; asked once.
+// Which vector paths this processor can take, and the one cap on them that
+// tests turn down. Every fast path of the library (the 3- and 4-byte plane
+// splits, the 1-bit row packing, the CMYK to sRGB formula) asks here.
 #pragma once
+
+#include <atomic>
+#include <cstdint>
 
 #if defined(__x86_64__) || defined(__i386__)
 #include <immintrin.h>
 #define TESSARINE_SHUFFLE_PATH 1
 #endif
 
-namespace tessarine::bitmap {
+namespace tessarine {
 
-#ifdef TESSARINE_SHUFFLE_PATH
-// Byte shuffles (SSSE3). The probe runs at first call, after the processor
-// model is known, rather than in a static initialiser that may run first.
-inline bool HasByteShuffle() {
-    static const bool has = [] {
-        __builtin_cpu_init();
-        return __builtin_cpu_supports("ssse3") != 0;
-    }();
-    return has;
+// Slowest first; a processor that has a path has every one before it.
+enum class VectorPath : uint8_t {
+    kPlain,    // scalar code only
+    kShuffle,  // 128-bit byte shuffles (SSSE3)
+    kWide,     // 256-bit vectors (AVX2)
+    kPermute,  // 512-bit byte permutes (AVX-512 F, BW and VBMI)
+};
+
+namespace detail {
+extern std::atomic<VectorPath> g_activeVectorPath;
+}  // namespace detail
+
+// The fastest path a call may take. Set once while the library loads; a
+// call made before that (from another initialiser) reads kPlain and takes
+// the plain path, which gives the same bytes.
+inline VectorPath ActiveVectorPath() {
+    return detail::g_activeVectorPath.load(std::memory_order_relaxed);
 }
 
-// 256-bit byte shuffles (AVX2).
-inline bool HasWideShuffle() {
-    static const bool has = HasByteShuffle() && __builtin_cpu_supports("avx2") != 0;
-    return has;
-}
+// The fastest path this processor has.
+VectorPath ProcessorVectorPath();
 
-// 512-bit byte permutes (AVX-512 VBMI).
-inline bool HasBytePermute() {
-    static const bool has = HasWideShuffle() && __builtin_cpu_supports("avx512f") != 0 &&
-                            __builtin_cpu_supports("avx512bw") != 0 &&
-                            __builtin_cpu_supports("avx512vbmi") != 0;
-    return has;
-}
-#endif
+// Caps every fast path at `fastest` (kPlain turns them all off) and returns
+// the previous cap; a path the processor lacks stays off whatever the cap.
+// For tests, which run each path the processor has.
+VectorPath LimitVectorPaths(VectorPath fastest);
 
-}  // namespace tessarine::bitmap
+}  // namespace tessarine

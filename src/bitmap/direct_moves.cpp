@@ -105,8 +105,10 @@ struct Job {
     }
     // The destination tile is read first unless the intersection replaces
     // whole tile rows; a masked move keeps unmasked pixels, so it always reads.
-    bool ReadsDestination(const RECT &I, const HVT_TileHdr &t) const {
-        return masked || I.left != t.left || I.right != t.right;
+    int32_t ReadDestinationTile(HVT_FileInfo *info, int32_t i, const HVT_TileHdr &t,
+                                const RECT &I) const {
+        if (!masked && I.left == t.left && I.right == t.right) return kOk;
+        return HVT_ReadTile(dstSub, info, i, I.top - t.top, I.bottom - I.top, info->tileBuffer);
     }
 };
 
@@ -128,7 +130,8 @@ int32_t WalkTiles(HVT_FileInfo *info, uint8_t sub, const RECT &R, int d, bool cl
     const int64_t total = across * slot.tilesDown;
     if (across <= 0 || total <= 0) return kOk;
     int64_t first = HVT_PixelInWhichTile(slot.tilesAcross, R.left, R.top);
-    int64_t last = HVT_PixelInWhichTile(slot.tilesAcross, R.right - 1, R.top);
+    const int32_t lastX = R.right == INT32_MIN ? INT32_MIN : R.right - 1;
+    int64_t last = HVT_PixelInWhichTile(slot.tilesAcross, lastX, R.top);
     if (clamped) {
         first = std::max<int64_t>(first, 0);
         last = std::min<int64_t>(last, total - 1);
@@ -175,23 +178,29 @@ int32_t MemoryToMemory(const Job &job) {
 int32_t MemoryToTile(const Job &job) {
     FileState file;
     // The masked route always asks for a descriptor of its own; it is closed
-    // again at the end, so that no descriptor outlives the call.
+    // again at the end, so that no descriptor outlives the call. The record
+    // it is begun from shows no descriptor, so that a failure before the
+    // file is opened cannot close the bitmap's own.
     const int32_t open = job.masked ? 1 : job.dst->tileFile == -1;
-    int32_t status = file.Begin(job.dst, open, open);
+    BI_Bitmap unopened;
+    const BI_Bitmap *from = job.dst;
+    if (job.masked && job.dst->tileFile != -1) {
+        unopened = *job.dst;
+        unopened.tileFile = -1;
+        from = &unopened;
+    }
+    int32_t status = file.Begin(from, open, open);
     if (Failed(status)) return status;
-    const MemoryPixels from(job.src);
+    const MemoryPixels pixels(job.src);
     HVT_FileInfo *info = file.Info();
     const RECT reach = Moved(OnImage(info, job.dstSub, job.dstRect), job.Dx(), job.Dy());
-    if (!Empty(reach) && !from.Holds(job.src, job.d, reach)) return kErrGeneral;
-    const bm::PixelArea source = from.Area(job.src);
+    if (!Empty(reach) && !pixels.Holds(job.src, job.d, reach)) return kErrGeneral;
+    const bm::PixelArea source = pixels.Area(job.src);
     return WalkTiles(info, job.dstSub, job.dstRect, job.d, false,
                      [&](int32_t i, const HVT_TileHdr &t, const RECT &I) {
                          const int32_t firstRow = I.top - t.top, rows = I.bottom - I.top;
-                         if (job.ReadsDestination(I, t)) {
-                             const int32_t s = HVT_ReadTile(job.dstSub, info, i, firstRow, rows,
-                                                            info->tileBuffer);
-                             if (Failed(s)) return s;
-                         }
+                         const int32_t s0 = job.ReadDestinationTile(info, i, t, I);
+                         if (Failed(s0)) return s0;
                          const bm::PixelArea buffer{info->tileBuffer, TileStride(t, job.d),
                                                     file.TileBufferFence()};
                          const int32_t s = job.Move(source, Moved(I, job.Dx(), job.Dy()), buffer,
@@ -233,6 +242,9 @@ int32_t TileToTile(const Job &job) {
     if (Failed(status)) return status;
     status = dstFile.Begin(job.dst, dstOpen, dstOpen);
     if (Failed(status)) return status;
+    // The block is laid out by the record's depth and filled by the file's:
+    // a record that disagrees with its file cannot take this route.
+    if (srcFile.Info()->header->bitsPerPixel != job.d) return kErrUnsupported;
     // One tile's rows with two bytes to spare for the row movers.
     const int64_t S = ((int64_t{ts::kTileWidth} * job.d + 7) >> 3) + 2;
     auto *block = static_cast<uint8_t *>(MEM_AllocPtr(0, static_cast<uint32_t>(S * ts::kTileHeight)));
@@ -244,21 +256,27 @@ int32_t TileToTile(const Job &job) {
     return WalkTiles(out, job.dstSub, job.dstRect, job.d, job.masked,
                      [&](int32_t i, const HVT_TileHdr &t, const RECT &I) {
                          const int32_t firstRow = I.top - t.top, rows = I.bottom - I.top;
-                         if (job.ReadsDestination(I, t)) {
-                             const int32_t s = HVT_ReadTile(job.dstSub, out, i, firstRow, rows,
-                                                            out->tileBuffer);
-                             if (Failed(s)) return s;
-                         }
+                         const int32_t s0 = job.ReadDestinationTile(out, i, t, I);
+                         if (Failed(s0)) return s0;
                          const RECT from = Moved(I, job.Dx(), job.Dy());
                          // The block starts on the byte that holds the left edge.
                          // (A depth of 0 is refused by the pixel mover below.)
                          const int32_t a = job.d == 0 ? from.left : static_cast<int32_t>(
                              ((int64_t{job.d} * from.left) & ~int64_t{7}) / job.d);
                          const HVT_Box box{a, from.top, from.right, from.bottom};
-                         int32_t s = HVT_ReadBlock(job.srcSub, in, &box, static_cast<int32_t>(S), block);
-                         if (Failed(s)) return s;
                          const bm::PixelArea buffer{out->tileBuffer, TileStride(t, job.d),
                                                     dstFile.TileBufferFence()};
+                         if (!job.masked && (job.d == 8 || job.d == 24 || job.d == 32)) {
+                             // Whole bytes land where the copy out of the block
+                             // would put them: read them there at once.
+                             uint8_t *at = out->tileBuffer + ((int64_t{I.left} - t.left) * job.d >> 3);
+                             const int32_t s = HVT_ReadBlock(job.srcSub, in, &box,
+                                                             static_cast<int32_t>(buffer.stride), at);
+                             if (Failed(s)) return s;
+                             return HVT_SaveTile(job.dstSub, out, i, firstRow, rows, out->tileBuffer);
+                         }
+                         int32_t s = HVT_ReadBlock(job.srcSub, in, &box, static_cast<int32_t>(S), block);
+                         if (Failed(s)) return s;
                          const RECT inBlock{from.left - a, 0, from.left - a + (I.right - I.left), rows};
                          s = job.Move(blockArea, inBlock, buffer, I.left - t.left, 0, I.left, I.top);
                          if (Failed(s)) return s;

@@ -104,10 +104,11 @@ void ForEachSetBit(const uint8_t *m, int phase, int32_t width, Apply &&apply) {
     }
 }
 
+// Zero-filled, so that values a table getter does not reach map to 0.
 struct Tables {
-    uint8_t entries[256 * 4];
+    uint8_t entries[256 * 4] = {};
     int32_t count = 0;
-    uint8_t map[256];
+    uint8_t map[256] = {};
 };
 
 int32_t ReadTables(Kind kind, const BI_Bitmap *src, const BI_Bitmap *dst, Tables *t) {

@@ -396,48 +396,44 @@ TESSARINE_PERMUTE_TARGET void JoinPermuted(const uint8_t *r, const uint8_t *g, c
 
 #endif
 
-int gPathLimit = kRgbPathPermute;
-
 }  // namespace
 
-int LimitRgbPaths(int fastest) {
-    const int previous = gPathLimit;
-    gPathLimit = fastest;
-    return previous;
-}
-
+// The fastest path first: each vector path finishes a run's tail on the
+// next slower one.
 void SplitRgb(const uint8_t *pixels, int64_t count, uint8_t *r, uint8_t *g, uint8_t *b) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (HasBytePermute() && gPathLimit >= kRgbPathPermute)
-        return SplitPermuted(pixels, count, r, g, b);
-    if (HasWideShuffle() && gPathLimit >= kRgbPathWide) return SplitWide(pixels, count, r, g, b);
-    if (HasByteShuffle() && gPathLimit >= kRgbPathShuffle)
-        return SplitShuffled(pixels, count, r, g, b);
+    switch (ActiveVectorPath()) {
+        case VectorPath::kPermute: return SplitPermuted(pixels, count, r, g, b);
+        case VectorPath::kWide: return SplitWide(pixels, count, r, g, b);
+        case VectorPath::kShuffle: return SplitShuffled(pixels, count, r, g, b);
+        case VectorPath::kPlain: break;
+    }
 #endif
     SplitPlain(pixels, count, r, g, b);
 }
 
 void JoinRgb(const uint8_t *r, const uint8_t *g, const uint8_t *b, int64_t count, uint8_t *pixels) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (HasBytePermute() && gPathLimit >= kRgbPathPermute)
-        return JoinPermuted(r, g, b, count, pixels);
-    if (HasWideShuffle() && gPathLimit >= kRgbPathWide) return JoinWide(r, g, b, count, pixels);
-    if (HasByteShuffle() && gPathLimit >= kRgbPathShuffle)
-        return JoinShuffled(r, g, b, count, pixels);
+    switch (ActiveVectorPath()) {
+        case VectorPath::kPermute: return JoinPermuted(r, g, b, count, pixels);
+        case VectorPath::kWide: return JoinWide(r, g, b, count, pixels);
+        case VectorPath::kShuffle: return JoinShuffled(r, g, b, count, pixels);
+        case VectorPath::kPlain: break;
+    }
 #endif
     JoinPlain(r, g, b, count, pixels);
 }
 
 void SplitCmyk(const uint8_t *pixels, int64_t count, uint8_t *const planes[4]) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (HasByteShuffle()) return SplitCmykShuffled(pixels, count, planes);
+    if (ActiveVectorPath() >= VectorPath::kShuffle) return SplitCmykShuffled(pixels, count, planes);
 #endif
     SplitCmykPlain(pixels, count, planes);
 }
 
 void JoinCmyk(const uint8_t *const planes[4], int64_t count, uint8_t *pixels) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (HasByteShuffle()) return JoinCmykShuffled(planes, count, pixels);
+    if (ActiveVectorPath() >= VectorPath::kShuffle) return JoinCmykShuffled(planes, count, pixels);
 #endif
     JoinCmykPlain(planes, count, pixels);
 }

@@ -2,10 +2,45 @@
 // carries their bodies.
 #include "bitmap/row_bits.h"
 
+#include "bitmap/cpu_features.h"
+
 #include <tessarine/bitmap.h>
 #include <tessarine/core.h>
 
 namespace tessarine::bitmap {
+namespace {
+
+#ifdef TESSARINE_SHUFFLE_PATH
+// 32 bytes: each byte's bits moved up by r and filled from the next byte's
+// top. Bytes have no shift of their own; the 16-bit shifts are masked.
+__attribute__((target("avx2"))) inline void ShiftStep(const uint8_t *in, uint8_t *out, __m128i up,
+                                                      __m128i down, __m256i keepUp,
+                                                      __m256i keepDown) {
+    const __m256i a = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(in));
+    const __m256i b = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(in + 1));
+    const __m256i v = _mm256_or_si256(_mm256_and_si256(_mm256_sll_epi16(a, up), keepUp),
+                                      _mm256_and_si256(_mm256_srl_epi16(b, down), keepDown));
+    _mm256_storeu_si256(reinterpret_cast<__m256i *>(out), v);
+}
+
+__attribute__((target("avx2"))) int64_t ShiftBytesLeftWide(const uint8_t *in, int64_t n, int r,
+                                                           uint8_t *out) {
+    const __m128i up = _mm_cvtsi32_si128(r), down = _mm_cvtsi32_si128(8 - r);
+    const __m256i keepUp = _mm256_set1_epi8(static_cast<char>((0xFF << r) & 0xFF));
+    const __m256i keepDown = _mm256_set1_epi8(static_cast<char>(0xFF >> (8 - r)));
+    int64_t k = 0;
+    for (; k + 128 <= n; k += 128) {
+        ShiftStep(in + k, out + k, up, down, keepUp, keepDown);
+        ShiftStep(in + k + 32, out + k + 32, up, down, keepUp, keepDown);
+        ShiftStep(in + k + 64, out + k + 64, up, down, keepUp, keepDown);
+        ShiftStep(in + k + 96, out + k + 96, up, down, keepUp, keepDown);
+    }
+    for (; k + 32 <= n; k += 32) ShiftStep(in + k, out + k, up, down, keepUp, keepDown);
+    return k;
+}
+#endif
+
+}  // namespace
 
 void CopyWholeBytes(const uint8_t *src, int32_t n, uint8_t *dst) { MEM_Copy(src, dst, n); }
 
@@ -22,6 +57,9 @@ void ShiftBytesLeft(const uint8_t *in, int64_t n, int r, uint8_t *out) {
             return;
         }
         const int back = 8 - r;
+#ifdef TESSARINE_SHUFFLE_PATH
+        if (n >= 64 && HasWideShuffle()) k = ShiftBytesLeftWide(in, n, r, out);
+#endif
         for (; k + 8 <= n; k += 8)
             StoreBE64(out + k, (LoadBE64(in + k) << r) | (uint64_t{in[k + 8]} >> back));
     }

@@ -53,14 +53,14 @@ __attribute__((target("ssse3"))) void UnpackShuffled(const uint8_t *src, int64_t
 
 void UnpackFlagBytes(const uint8_t *src, int64_t bytes, uint8_t *out) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (HasByteShuffle()) return UnpackShuffled(src, bytes, out);
+    if (ActiveVectorPath() >= VectorPath::kShuffle) return UnpackShuffled(src, bytes, out);
 #endif
     for (int64_t i = 0; i < bytes; ++i, out += 8) Store64(out, kBitFlags[src[i]]);
 }
 
 void PackFlagBytes(const uint8_t *values, int64_t bytes, uint8_t *dst, bool highBit) {
 #ifdef TESSARINE_SHUFFLE_PATH
-    if (HasByteShuffle()) return PackShuffled(values, bytes, dst, highBit);
+    if (ActiveVectorPath() >= VectorPath::kShuffle) return PackShuffled(values, bytes, dst, highBit);
 #endif
     if (highBit)
         PackPlain<HighBit>(values, bytes, dst);

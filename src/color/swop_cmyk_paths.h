@@ -12,10 +12,9 @@ namespace tessarine::color {
 void SwopCmykToSRgbScalar(const uint8_t *cmyk, uint8_t *rgb);
 
 // The same operations on the same operands, four lanes at a time (AVX2).
-// Call only when HasAvx2() is true, with CX_CmykGammaTable(): taken by the
-// caller, so that the vector code makes no call.
+// Call only where the processor has VectorPath::kWide, with
+// CX_CmykGammaTable(): taken by the caller, so that the vector code makes no
+// call.
 void SwopCmykToSRgbAvx2(const uint8_t *cmyk, uint8_t *rgb, const GammaTable &gamma);
-
-bool HasAvx2();
 
 }  // namespace tessarine::color

@@ -1,5 +1,6 @@
 #include <tessarine/color.h>
 
+#include "bitmap/cpu_features.h"
 #include "color/device_tables.h"
 #include "color/gamma_tables.h"
 #include "color/lab_to_rgb.h"
@@ -49,30 +50,13 @@ void SwopCmykToSRgbScalar(const uint8_t *cmyk, uint8_t *rgb) {
     for (int i = 0; i < 3; ++i) rgb[i] = gamma.entry[static_cast<int>(Clamp01(v[i]) * 255.9)];
 }
 
-namespace {
-
-bool DetectAvx2() {
-    __builtin_cpu_init();
-    return __builtin_cpu_supports("avx2");
-}
-
-// Set while the library loads. A call made before that (from another
-// initialiser) finds false and takes the scalar path: the same bytes.
-const bool g_avx2 = DetectAvx2();
-
-}  // namespace
-
-bool HasAvx2() {
-    return g_avx2;
-}
-
 }  // namespace tessarine::color
 
 // The first call takes the scalar path, which builds the gamma table; the
 // vector path then finds it built.
 extern "C" TESSARINE_API void CX_SWOPCmyk2SRgb(const uint8_t *cmyk, uint8_t *rgb) {
     using namespace tessarine::color;
-    if (g_avx2) {
+    if (tessarine::ActiveVectorPath() >= tessarine::VectorPath::kWide) {
         if (const GammaTable *gamma = CmykGammaTableIfBuilt()) {
             SwopCmykToSRgbAvx2(cmyk, rgb, *gamma);
             return;

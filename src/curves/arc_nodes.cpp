@@ -40,6 +40,13 @@ extern "C" TESSARINE_API void ConvertArcToBezier(double radius, double centreX, 
     }
     // Only turns above one full circle go; a negative sweep stays as it is.
     while (sweep - kFullTurn > 1e-8) sweep -= kFullTurn;
+    // A negative radius with a sweep that passes the first length test would
+    // add quarters for ever: radius x rest only grows. Like an endless sweep,
+    // it writes nothing.
+    if (radius < 0 && radius * (sweep - kQuarterTurn) > 1e-8) {
+        *count = 0;
+        return;
+    }
     double h = sweep <= kQuarterTurn ? sweep * kPerQuarter * radius : radius;
     h = h * kHandleFactor;
 
@@ -51,7 +58,8 @@ extern "C" TESSARINE_API void ConvertArcToBezier(double radius, double centreX, 
         k += 3;
         const double rest = remaining - kQuarterTurn;
         // A test on arc length: a leftover shorter than 1e-8 adds no piece.
-        if (radius * rest <= 1e-8) break;
+        // Never past the caller's 18 elements.
+        if (radius * rest <= 1e-8 || k >= 15) break;
         angle += kQuarterTurn;
         remaining = rest;
         if (rest < kQuarterTurn) h = rest * kPerQuarter * radius * kHandleFactor;

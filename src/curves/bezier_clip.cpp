@@ -4,6 +4,7 @@
 // Pending pairs lie on a stack of our own, never in recursion.
 #include <cmath>
 #include <cstring>
+#include <initializer_list>
 
 #include "core/status.h"
 #include "curves/clip.h"
@@ -14,10 +15,36 @@ namespace {
 
 constexpr uint32_t kPairPoints = 10;
 constexpr uint32_t kStackStep = 200;
-// Beyond this the pairs have stopped separating (a tolerance below what
-// rounding allows, values that are not numbers): a status, not a hang.
-constexpr uint32_t kMostStackPoints = 131072;
-constexpr uint64_t kMostPairs = 2000000;
+// Beyond these the pairs have stopped separating (a tolerance at or below
+// what rounding allows, values that are not numbers): a status, not a hang.
+// Runs on finite curves with a workable tolerance stay far below them: the
+// stack peaks at a few hundred points, and nearly coincident curves 1e11
+// tolerances long take under a million pairs.
+constexpr uint32_t kMostStackPoints = 16384;
+constexpr uint64_t kMostPairs = 1048576;
+// With a tolerance below what the coordinates' rounding can resolve (0 and
+// below included) only exactly straight pieces make a leaf: such a run ends
+// where its pairs fall apart, which they do early or never.
+constexpr uint64_t kMostPairsBelowRounding = 65536;
+constexpr double kRounding = 1e-15;
+
+// Whether frames can get thinner than tol: not at or below the rounding of
+// the largest coordinate, nor with values that are not numbers.
+bool Resolvable(const BZ_Curve &a, const BZ_Curve &b, double tol) {
+    const BZ_Point p[8] = {a.p0, a.p1, a.p2, a.p3, b.p0, b.p1, b.p2, b.p3};
+    double largest = 0.0;
+    for (const BZ_Point &q : p) {
+        for (double v : {q.x, q.y}) {
+            if (std::isnan(v)) return false;
+            if (std::fabs(v) > largest) largest = std::fabs(v);
+        }
+    }
+    return tol > 0 && tol > largest * kRounding;
+}
+// A piece this narrow is 50 quarterings deep, far below what the rounding
+// of any coordinate can tell apart; a run that needs to split it has lost
+// its way.
+constexpr double kNarrowest = 1e-30;
 constexpr uint32_t kBigStack = 190;
 constexpr double kLeafGap = 0.001;
 constexpr double kSameResult = 0.0001;
@@ -30,8 +57,8 @@ class PairStack {
         if (points_ != nullptr) MEM_FreeHdl(points_);
     }
     int32_t Start() {
-        points_ = static_cast<BZ_Point *>(
-            MEM_AllocPtr(MEM_FLAG_ZERO, kStackStep * sizeof(BZ_Point)));
+        points_ =
+            static_cast<BZ_Point *>(MEM_AllocPtr(MEM_FLAG_ZERO, kStackStep * sizeof(BZ_Point)));
         if (points_ == nullptr) return kErrMemory;
         capacity_ = kStackStep;
         return kOk;
@@ -83,8 +110,7 @@ struct LocalResult {
 // All the state of one call.
 class ClipRun {
   public:
-    ClipRun(const BZ_Curve &a, const BZ_Curve &b, const ClipResult &out, double tol,
-            int16_t *kind)
+    ClipRun(const BZ_Curve &a, const BZ_Curve &b, const ClipResult &out, double tol, int16_t *kind)
         : wholeA_(a), wholeB_(b), out_(out), tol_(tol), kind_(kind) {}
     ~ClipRun() { FreeEntireList(&list_); }
 
@@ -123,8 +149,8 @@ int32_t ClipRun::CheckedPush(const ClipPiece &a, const ClipPiece &b) {
     return stack_.Push(a, b);
 }
 
-int32_t ClipRun::SplitA(const ClipPiece &a, const ClipFrame &fb, const ClipPiece &b,
-                        bool bFlat) {
+int32_t ClipRun::SplitA(const ClipPiece &a, const ClipFrame &fb, const ClipPiece &b, bool bFlat) {
+    if (a.t1 - a.t0 < kNarrowest || (!bFlat && b.t1 - b.t0 < kNarrowest)) return kErrStackOverflow;
     ClipPiece qa[4];
     SplitIntoQuarters(a, qa);
     bool touches[4];
@@ -152,6 +178,7 @@ int32_t ClipRun::SplitA(const ClipPiece &a, const ClipFrame &fb, const ClipPiece
 }
 
 int32_t ClipRun::SplitB(const ClipPiece &a, const ClipFrame &fa, const ClipPiece &b) {
+    if (b.t1 - b.t0 < kNarrowest) return kErrStackOverflow;
     ClipPiece qb[4];
     SplitIntoQuarters(b, qb);
     for (int j = 0; j < 4; ++j) {
@@ -184,10 +211,10 @@ int32_t ClipRun::Insert(const LocalResult *first, const LocalResult *second) {
 int32_t ClipRun::Leaf(const ClipPiece &a, const ClipPiece &b) {
     stop_ = false;
     int16_t k = 0;
-    const int32_t status = NewLineSegSegIntersect(
-        a.curve.p0.x, a.curve.p0.y, a.curve.p3.x, a.curve.p3.y, b.curve.p0.x, b.curve.p0.y,
-        b.curve.p3.x, b.curve.p3.y, a.t0, a.t1, b.t0, b.t1, 1, out_.tA, out_.tB, out_.pts,
-        out_.count, tol_, &k);
+    const int32_t status =
+        NewLineSegSegIntersect(a.curve.p0.x, a.curve.p0.y, a.curve.p3.x, a.curve.p3.y, b.curve.p0.x,
+                               b.curve.p0.y, b.curve.p3.x, b.curve.p3.y, a.t0, a.t1, b.t0, b.t1, 1,
+                               out_.tA, out_.tB, out_.pts, out_.count, tol_, &k);
     if (Failed(status)) return status;
     if (*kind_ == 0) *kind_ = k;
     if (k == 0) return kOk;
@@ -249,9 +276,11 @@ int32_t ClipRun::Run(double *curveA, double *curveB) {
     if (Failed(status)) return status;
     status = stack_.Push(ClipPiece{wholeA_, 0.0, 1.0}, ClipPiece{wholeB_, 0.0, 1.0});
     if (Failed(status)) return status;
+    const uint64_t mostPairs =
+        Resolvable(wholeA_, wholeB_, tol_) ? kMostPairs : kMostPairsBelowRounding;
     uint64_t pairs = 0;
     while (!stack_.Empty()) {
-        if (++pairs > kMostPairs) return kErrStackOverflow;
+        if (++pairs > mostPairs) return kErrStackOverflow;
         ClipPiece a, b;
         stack_.Pop(&a, &b);
         // The caller's curves are the working storage of the pair in hand.

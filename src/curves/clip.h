@@ -60,8 +60,7 @@ int32_t WholeCurvesCoincide(const BZ_Curve &a, const BZ_Curve &b, double tol,
                             const ClipResult &out);
 // A stretch where an end of one curve lies on the other: kind 4 with two
 // entries, or 0 with nothing written.
-int16_t FindPartialOverlap(const BZ_Curve &a, const BZ_Curve &b, double tol,
-                           const ClipResult &out);
+int16_t FindPartialOverlap(const BZ_Curve &a, const BZ_Curve &b, double tol, const ClipResult &out);
 
 // A zero-filled record; null when the heap refuses.
 OverlapRec *NewOverlapRec();

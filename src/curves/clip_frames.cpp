@@ -22,7 +22,9 @@ int Classify(double v, double low, double high) {
 }
 
 // Same class for all four control points.
-bool AllIn(const int c[4]) { return c[0] == c[1] && c[0] == c[2] && c[0] == c[3]; }
+bool AllIn(const int c[4]) {
+    return c[0] == c[1] && c[0] == c[2] && c[0] == c[3];
+}
 
 }  // namespace
 
@@ -33,8 +35,8 @@ ClipFrame BuildClipFrame(const BZ_Curve &c) {
     const double s = w3.x * w3.x + w3.y * w3.y;
     const double length = std::sqrt(s);
     // A closed piece has no chord to lean on.
-    f.dir = s >= 1e-16 && length >= 1e-8 ? BZ_Point{w3.x / length, w3.y / length}
-                                         : BZ_Point{1.0, 0.0};
+    f.dir =
+        s >= 1e-16 && length >= 1e-8 ? BZ_Point{w3.x / length, w3.y / length} : BZ_Point{1.0, 0.0};
     const double d1 = Across(f, c.p1), d2 = Across(f, c.p2);
     const double smaller = d1 < d2 ? d1 : d2;
     const double larger = d1 > d2 ? d1 : d2;
@@ -84,9 +86,8 @@ void SplitIntoQuarters(const ClipPiece &piece, ClipPiece quarters[4]) {
         r.p0 = q.p3;
         r.p1 = BZ_Point{2 * q.p3.x - q.p2.x, 2 * q.p3.y - q.p2.y};
         r.p2 = BZ_Point{2 * r.p1.x - 2 * q.p2.x + q.p1.x, 2 * r.p1.y - 2 * q.p2.y + q.p1.y};
-        r.p3 = BZ_Point{
-            3 * (r.p2.x - r.p1.x) + r.p0.x + 3 * q.p1.x + q.p3.x - 3 * q.p2.x - q.p0.x,
-            3 * (r.p2.y - r.p1.y) + r.p0.y + 3 * q.p1.y + q.p3.y - 3 * q.p2.y - q.p0.y};
+        r.p3 = BZ_Point{3 * (r.p2.x - r.p1.x) + r.p0.x + 3 * q.p1.x + q.p3.x - 3 * q.p2.x - q.p0.x,
+                        3 * (r.p2.y - r.p1.y) + r.p0.y + 3 * q.p1.y + q.p3.y - 3 * q.p2.y - q.p0.y};
         quarters[i].curve = r;
         q = r;
     }

@@ -12,25 +12,27 @@ namespace {
 
 BZ_Curve RightHalf(const BZ_Curve &c, double t) {
     BZ_Point l1, l2, m, r1, r2;
-    SubDivideBezier(c.p0.x, c.p0.y, c.p1.x, c.p1.y, c.p2.x, c.p2.y, c.p3.x, c.p3.y, t, &l1.x,
-                    &l1.y, &r2.x, &r2.y, &l2.x, &l2.y, &m.x, &m.y, &r1.x, &r1.y);
+    SubDivideBezier(c.p0.x, c.p0.y, c.p1.x, c.p1.y, c.p2.x, c.p2.y, c.p3.x, c.p3.y, t, &l1.x, &l1.y,
+                    &r2.x, &r2.y, &l2.x, &l2.y, &m.x, &m.y, &r1.x, &r1.y);
     return BZ_Curve{m, r1, r2, c.p3};
 }
 
 BZ_Curve LeftHalf(const BZ_Curve &c, double t) {
     BZ_Point l1, l2, m, r1, r2;
-    SubDivideBezier(c.p0.x, c.p0.y, c.p1.x, c.p1.y, c.p2.x, c.p2.y, c.p3.x, c.p3.y, t, &l1.x,
-                    &l1.y, &r2.x, &r2.y, &l2.x, &l2.y, &m.x, &m.y, &r1.x, &r1.y);
+    SubDivideBezier(c.p0.x, c.p0.y, c.p1.x, c.p1.y, c.p2.x, c.p2.y, c.p3.x, c.p3.y, t, &l1.x, &l1.y,
+                    &r2.x, &r2.y, &l2.x, &l2.y, &m.x, &m.y, &r1.x, &r1.y);
     return BZ_Curve{c.p0, l1, l2, m};
 }
 
-double Dist(BZ_Point a, BZ_Point b) { return Distance(a.x, a.y, b.x, b.y); }
+double Dist(BZ_Point a, BZ_Point b) {
+    return Distance(a.x, a.y, b.x, b.y);
+}
 
 // The parameter at which the point lies on the curve, when it does.
 bool LiesOn(const BZ_Curve &c, BZ_Point p, double tol, double *t) {
     double dist = 0.0, x = 0.0, y = 0.0;
-    return SelectCurveTo_port(c.p0.x, c.p0.y, c.p1.x, c.p1.y, c.p2.x, c.p2.y, c.p3.x, c.p3.y,
-                              &dist, t, &x, &y, p.x, p.y, tol, tol, tol) == 1;
+    return SelectCurveTo_port(c.p0.x, c.p0.y, c.p1.x, c.p1.y, c.p2.x, c.p2.y, c.p3.x, c.p3.y, &dist,
+                              t, &x, &y, p.x, p.y, tol, tol, tol) == 1;
 }
 
 bool Near(BZ_Point a, BZ_Point b) {

@@ -16,9 +16,9 @@ bool IsDot(double minX, double maxX, double minY, double maxY, double tol) {
 
 extern "C" {
 
-TESSARINE_API int32_t NewCurveCurveIntersect(const double *curveA, const double *curveB,
-                                             double *tA, double *tB, BZ_Point *pts,
-                                             uint16_t *count, double tol, int16_t *kind) {
+TESSARINE_API int32_t NewCurveCurveIntersect(const double *curveA, const double *curveB, double *tA,
+                                             double *tB, BZ_Point *pts, uint16_t *count, double tol,
+                                             int16_t *kind) {
     *count = 0;
     *kind = 0;
     double axMin, axMax, ayMin, ayMax, bxMin, bxMax, byMin, byMax;

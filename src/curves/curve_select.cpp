@@ -9,8 +9,10 @@ namespace {
 
 struct Sextic {
     double c6, c5, c4, c3, c2, c1, c0;
-    double F(double t) const { return (((((c6 * t + c5) * t + c4) * t + c3) * t + c2) * t + c1) * t + c0; }
-    // Half the derivative's worth of work: g = f', g' = f''.
+    double F(double t) const {
+        return (((((c6 * t + c5) * t + c4) * t + c3) * t + c2) * t + c1) * t + c0;
+    }
+    // g = f' and g' = f''.
     double G(double t) const {
         return ((((6 * c6 * t + 5 * c5) * t + 4 * c4) * t + 3 * c3) * t + 2 * c2) * t + c1;
     }
@@ -19,19 +21,20 @@ struct Sextic {
     }
 };
 
-double Dot(BZ_Point u, BZ_Point v) { return u.x * v.x + u.y * v.y; }
+double Dot(BZ_Point u, BZ_Point v) {
+    return u.x * v.x + u.y * v.y;
+}
 
-// Lowest sample of S[1..7] against S[0], the earliest of equal ones.
+}  // namespace
+
+namespace tessarine::curves {
+
 int LowestSample(const double S[9]) {
     int m = 0;
     for (int i = 1; i <= 7; ++i)
         if (S[i] < S[m]) m = i;
     return m;
 }
-
-}  // namespace
-
-namespace tessarine::curves {
 
 int32_t NearestOnCubic(const BZ_CurveCoef &k, double px, double py, double *dist, double *t,
                        double *x, double *y, double limit, double eps) {
@@ -131,9 +134,9 @@ TESSARINE_API int32_t SarnSelectCurveTo(double x0, double y0, double x1, double 
 }
 
 TESSARINE_API int32_t SelectCurveTo_port(double x0, double y0, double x1, double y1, double x2,
-                                         double y2, double x3, double y3, double *dist,
-                                         double *t, double *x, double *y, double px, double py,
-                                         double limit, double eps, double reject) {
+                                         double y2, double x3, double y3, double *dist, double *t,
+                                         double *x, double *y, double px, double py, double limit,
+                                         double eps, double reject) {
     // A first-order estimate of the distance to the cubic's implicit locus:
     // the implicit equation at the pick point over its gradient.
     const BZ_Point d1{x1 - x0, y1 - y0}, d2{x2 - x1, y2 - y1}, d3{x3 - x2, y3 - y2};

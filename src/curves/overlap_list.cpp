@@ -14,7 +14,9 @@ namespace {
 // values that never merge (not numbers) could get there.
 constexpr int kMostRemerges = 2100;
 
-OverlapRec *Rec(ListNode *node) { return reinterpret_cast<OverlapRec *>(node); }
+OverlapRec *Rec(ListNode *node) {
+    return reinterpret_cast<OverlapRec *>(node);
+}
 
 void TakeStart(OverlapRec *to, const OverlapRec *from) {
     to->a0 = from->a0;
@@ -44,7 +46,9 @@ void Write(const ClipResult &out, double a, double b, double x, double y) {
     *out.count = static_cast<uint16_t>(i + 1);
 }
 
-bool Inner(double v) { return !(v < 0.0001 || v > 0.9999); }
+bool Inner(double v) {
+    return !(v < 0.0001 || v > 0.9999);
+}
 
 // The ends of a stretch worth reporting: those that lie at the curves' ends,
 // or both when a short stretch does not settle it.
@@ -122,8 +126,7 @@ int32_t OverlapRecsToResult(ListNode **head, const ClipResult &out) {
     if (*head == nullptr) return kOk;
     double gap = 0.0001;
     for (int round = 0; ListNumber(*head) > 7; ++round) {
-        if ((gap > 0.055 && ListNumber(*head) > 8) || round >= kMostRemerges)
-            return kErrGeneral;
+        if ((gap > 0.055 && ListNumber(*head) > 8) || round >= kMostRemerges) return kErrGeneral;
         gap *= 2;
         RemergeOverlapRecs(head, gap);
     }

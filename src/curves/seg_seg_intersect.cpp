@@ -22,7 +22,9 @@ double Clamp01(double v) {
     return v;
 }
 
-double MapInto(double t, double start, double end) { return (end - start) * t + start; }
+double MapInto(double t, double start, double end) {
+    return (end - start) * t + start;
+}
 
 struct Entries {
     double *tA;
@@ -48,9 +50,8 @@ bool PullOntoEnd(BZ_Point *point, double endX, double endY, double tol) {
     return true;
 }
 
-void Overlap(double x0, double y0, double x1, double y1, double x2, double y2, double x3,
-             double y3, double a0, double a1, double b0, double b1, const Entries &out,
-             int16_t *kind) {
+void Overlap(double x0, double y0, double x1, double y1, double x2, double y2, double x3, double y3,
+             double a0, double a1, double b0, double b1, const Entries &out, int16_t *kind) {
     *kind = 4;
     const double dx = x1 - x0, dy = y1 - y0, ex = x3 - x2, ey = y3 - y2;
     const double wx = std::fmin(std::fabs(dx), std::fabs(ex));
@@ -88,8 +89,7 @@ void Overlap(double x0, double y0, double x1, double y1, double x2, double y2, d
         }
     } else {
         // No guard in x: a zero width gives what the division gives.
-        for (int i = 0; i < 2; ++i)
-            out.tA[i] = MapInto(Clamp01((out.pts[i].x - x0) / dx), a0, a1);
+        for (int i = 0; i < 2; ++i) out.tA[i] = MapInto(Clamp01((out.pts[i].x - x0) / dx), a0, a1);
     }
     const double component = inY ? ey : ex;
     const double origin = inY ? y2 : x2;
@@ -111,16 +111,18 @@ void Overlap(double x0, double y0, double x1, double y1, double x2, double y2, d
 
 }  // namespace
 
-extern "C" TESSARINE_API int32_t NewLineSegSegIntersect(
-    double x0, double y0, double x1, double y1, double x2, double y2, double x3, double y3,
-    double a0, double a1, double b0, double b1, int16_t allowOverlap, double *tA, double *tB,
-    BZ_Point *pts, uint16_t *count, double tol, int16_t *kind) {
+extern "C" TESSARINE_API int32_t NewLineSegSegIntersect(double x0, double y0, double x1, double y1,
+                                                        double x2, double y2, double x3, double y3,
+                                                        double a0, double a1, double b0, double b1,
+                                                        int16_t allowOverlap, double *tA,
+                                                        double *tB, BZ_Point *pts, uint16_t *count,
+                                                        double tol, int16_t *kind) {
     const Entries out{tA, tB, pts, count};
     *kind = 0;
     *count = 0;
-    if (!BZ_BBoxBoxInt(std::fmin(x0, x1), std::fmin(y0, y1), std::fmax(x0, x1),
-                       std::fmax(y0, y1), std::fmin(x2, x3), std::fmin(y2, y3),
-                       std::fmax(x2, x3), std::fmax(y2, y3), tol))
+    if (!BZ_BBoxBoxInt(std::fmin(x0, x1), std::fmin(y0, y1), std::fmax(x0, x1), std::fmax(y0, y1),
+                       std::fmin(x2, x3), std::fmin(y2, y3), std::fmax(x2, x3), std::fmax(y2, y3),
+                       tol))
         return kOk;
 
     const double dx = x1 - x0, dy = y1 - y0;
@@ -171,8 +173,7 @@ extern "C" TESSARINE_API int32_t NewLineSegSegIntersect(
     const double s = std::fabs(BZ_Crossp(u.x, u.y, v.x, v.y));
 
     if (s <= kCollinearSine && std::fabs(c2) <= thr && std::fabs(c3) <= thr) {
-        if (allowOverlap != 0)
-            Overlap(x0, y0, x1, y1, x2, y2, x3, y3, a0, a1, b0, b1, out, kind);
+        if (allowOverlap != 0) Overlap(x0, y0, x1, y1, x2, y2, x3, y3, a0, a1, b0, b1, out, kind);
         return kOk;
     }
     if ((c2 >= thr && c3 >= thr) || (c2 <= -thr && c3 <= -thr)) return kOk;

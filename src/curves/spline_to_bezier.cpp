@@ -22,8 +22,7 @@ namespace {
 struct SplineWork {
     int L = 0;
     double *u = nullptr, *wx = nullptr, *wy = nullptr, *dx = nullptr, *dy = nullptr;
-    double *a = nullptr, *b = nullptr, *c = nullptr, *low = nullptr, *up = nullptr,
-           *f = nullptr;
+    double *a = nullptr, *b = nullptr, *c = nullptr, *low = nullptr, *up = nullptr, *f = nullptr;
 
     // The knot with the ends repeated outside 0 to L.
     double Knot(int i) const { return u[i < 0 ? 0 : (i > L ? L : i)]; }
@@ -136,8 +135,8 @@ void ToBezier(const SplineWork &w, const double *D, double *B) {
     B[3 * L - 1] = D[L + 1];
     B[3 * L] = D[L + 2];
     for (int i = 1; i <= L - 1; ++i) {
-        const double um2 = w.Knot(i - 2), um1 = w.Knot(i - 1), u0 = w.Knot(i),
-                     up1 = w.Knot(i + 1), up2 = w.Knot(i + 2);
+        const double um2 = w.Knot(i - 2), um1 = w.Knot(i - 1), u0 = w.Knot(i), up1 = w.Knot(i + 1),
+                     up2 = w.Knot(i + 2);
         B[3 * i - 1] = ((u0 - um2) * D[i + 1] + (up1 - u0) * D[i]) / (up1 - um2);
         B[3 * i + 1] = ((up2 - u0) * D[i + 1] + (u0 - um1) * D[i + 2]) / (up2 - um1);
         B[3 * i] = ((up1 - u0) * B[3 * i - 1] + (u0 - um1) * B[3 * i + 1]) / (up1 - um1);
@@ -148,8 +147,8 @@ void ToBezier(const SplineWork &w, const double *D, double *B) {
 
 extern "C" TESSARINE_API int32_t ArcToBezier(const double *x, const double *y, int16_t n,
                                              double startTangentX, double startTangentY,
-                                             double endTangentX, double endTangentY,
-                                             double **outX, double **outY, int16_t *count) {
+                                             double endTangentX, double endTangentY, double **outX,
+                                             double **outY, int16_t *count) {
     // Without two points there is no first chord to read.
     if (n < 2) return kErrArgument;
     BZ_Point first{x[1] - x[0], y[1] - y[0]};

@@ -11,7 +11,9 @@ namespace {
 
 // Every step of the split has this one shape, so that all callers agree bit
 // for bit.
-inline double Lerp(double a, double b, double t) { return (b - a) * t + a; }
+inline double Lerp(double a, double b, double t) {
+    return (b - a) * t + a;
+}
 
 }  // namespace
 
@@ -23,11 +25,10 @@ TESSARINE_API void SubDivideLine(double x0, double y0, double x1, double y1, dou
     *y = Lerp(y0, y1, t);
 }
 
-TESSARINE_API void SubDivideBezier(double x0, double y0, double x1, double y1, double x2,
-                                   double y2, double x3, double y3, double t, double *l1x,
-                                   double *l1y, double *r2x, double *r2y, double *l2x,
-                                   double *l2y, double *mx, double *my, double *r1x,
-                                   double *r1y) {
+TESSARINE_API void SubDivideBezier(double x0, double y0, double x1, double y1, double x2, double y2,
+                                   double x3, double y3, double t, double *l1x, double *l1y,
+                                   double *r2x, double *r2y, double *l2x, double *l2y, double *mx,
+                                   double *my, double *r1x, double *r1y) {
     const double L1x = Lerp(x0, x1, t), L1y = Lerp(y0, y1, t);
     const double Qx = Lerp(x1, x2, t), Qy = Lerp(y1, y2, t);
     const double R2x = Lerp(x2, x3, t), R2y = Lerp(y2, y3, t);
@@ -54,8 +55,7 @@ TESSARINE_API void ReverseCoord(BZ_Point *points, int16_t n) {
     }
 }
 
-TESSARINE_API int32_t CubicBezEval(const BZ_Point *points, double t, int16_t order,
-                                   BZ_Point *out) {
+TESSARINE_API int32_t CubicBezEval(const BZ_Point *points, double t, int16_t order, BZ_Point *out) {
     if (order < 0 || order > 1) return kErrArgument;
     enum Case { kStart, kEnd, kGeneral };
     Case where;
@@ -85,8 +85,8 @@ TESSARINE_API int32_t CubicBezEval(const BZ_Point *points, double t, int16_t ord
         if (where == kEnd) {
             tangent = BZ_Point{(w[i - 1].x - w[i].x) * 3, (w[i - 1].y - w[i].y) * 3};
         } else {
-            tangent = BZ_Point{(w[i].x - w[i - 1].x) * 3 / (1 - t),
-                               (w[i].y - w[i - 1].y) * 3 / (1 - t)};
+            tangent =
+                BZ_Point{(w[i].x - w[i - 1].x) * 3 / (1 - t), (w[i].y - w[i - 1].y) * 3 / (1 - t)};
         }
         *out = tangent;
         if (!EqualPoints(tangent.x, tangent.y, 0.0, 0.0)) return kOk;

@@ -16,6 +16,9 @@ inline constexpr double kFullTurn = 6.283185307179586;
 // 1 to 4, after folding the angle by at most one turn each way.
 int32_t QuadrantOfAngle(double angle);
 
+// Index of the lowest of S[0] to S[7]; the earliest of equal samples stays.
+int LowestSample(const double S[9]);
+
 // Nearest point of the power-form cubic ((a t + b) t + c) t + d to (px, py);
 // 1 for a hit within limit. dist, x and y are cleared first.
 int32_t NearestOnCubic(const BZ_CurveCoef &coef, double px, double py, double *dist, double *t,

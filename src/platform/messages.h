@@ -5,11 +5,8 @@
 
 namespace tessarine::platform {
 
-inline constexpr int32_t kFirstStringId = 16384;
-inline constexpr int32_t kLastStringId = 16415;
-
 // The text for a string id: the satellite's if it has one, else the built-in
-// one; null for an id outside the table.
+// one (the status table's); null for an id outside the table.
 const char *LoadString(int32_t id);
 
 // Framework message box: shows string `id`; returns the button pressed.

@@ -12,6 +12,7 @@
 #include "bitmap/rgb_split.h"
 #include "row_model.h"
 #include "test_support.h"
+#include "vector_paths.h"
 
 namespace {
 
@@ -393,13 +394,7 @@ namespace {
 TEST_F(RowConvert, TrueColourPlanesAtEveryAddressPhase) {
     constexpr uint8_t kFill = 0xA5;
     constexpr int64_t kPad = 80;
-    namespace bm = tessarine::bitmap;
-    struct Restore {
-        ~Restore() { bm::LimitRgbPaths(bm::kRgbPathPermute); }
-    } restore;
-    for (int path = bm::kRgbPathPlain; path <= bm::kRgbPathPermute; ++path) {
-        SCOPED_TRACE(path);
-        bm::LimitRgbPaths(path);
+    tstest::ForEachVectorPath([&] {
         for (int64_t n : {0, 1, 31, 32, 63, 64, 255, 256, 257, 319, 320, 383, 700, 1024, 1097}) {
             Bytes rgb(n * 3 + 2 * kPad);
             for (size_t i = 0; i < rgb.size(); ++i) rgb[i] = static_cast<uint8_t>(i * 7 + 3);
@@ -436,7 +431,46 @@ TEST_F(RowConvert, TrueColourPlanesAtEveryAddressPhase) {
                 }
             }
         }
-    }
+    });
+}
+
+// The 4-byte split and join on every path this processor has: lengths
+// around the 16-pixel blocks, planes and pixels at several address phases,
+// and not a byte written outside the run.
+TEST_F(RowConvert, CmykPlanesOnEveryVectorPath) {
+    constexpr uint8_t kFill = 0x3C;
+    constexpr int64_t kPad = 32;
+    tstest::ForEachVectorPath([&] {
+        for (int64_t n : {0, 1, 15, 16, 17, 31, 32, 33, 255, 1000, 1097}) {
+            Bytes cmyk(n * 4 + 2 * kPad);
+            for (size_t i = 0; i < cmyk.size(); ++i) cmyk[i] = static_cast<uint8_t>(i * 11 + 5);
+            for (int64_t phase = 0; phase < 16; phase += 3) {
+                const uint8_t *from = cmyk.data() + kPad + phase;
+                Bytes planes[4];
+                uint8_t *p[4];
+                for (int k = 0; k < 4; ++k) {
+                    planes[k].assign(n + 2 * kPad, kFill);
+                    p[k] = planes[k].data() + kPad + (phase * (k + 1)) % 16;
+                }
+                tessarine::bitmap::SplitCmyk(from, n, p);
+                for (int k = 0; k < 4; ++k)
+                    for (int64_t i = 0; i < static_cast<int64_t>(planes[k].size()); ++i) {
+                        const int64_t at = planes[k].data() + i - p[k];
+                        ASSERT_EQ(planes[k][i], at >= 0 && at < n ? from[4 * at + k] : kFill)
+                            << n << " " << phase << " " << k << " " << at;
+                    }
+                Bytes back(n * 4 + 2 * kPad, kFill);
+                uint8_t *out = back.data() + kPad + (phase * 5) % 16;
+                const uint8_t *const q[4] = {p[0], p[1], p[2], p[3]};
+                tessarine::bitmap::JoinCmyk(q, n, out);
+                for (int64_t i = 0; i < static_cast<int64_t>(back.size()); ++i) {
+                    const int64_t at = back.data() + i - out;
+                    ASSERT_EQ(back[i], at >= 0 && at < 4 * n ? from[at] : kFill)
+                        << n << " " << phase << " " << at;
+                }
+            }
+        }
+    });
 }
 
 }  // namespace
@@ -444,30 +478,32 @@ TEST_F(RowConvert, TrueColourPlanesAtEveryAddressPhase) {
 namespace {
 
 TEST_F(RowConvert, LongBlackAndWhiteRowsPackAndUnpackExactly) {
-    std::mt19937 rng(5);
-    for (int32_t x : {0, 3, 8, 13}) {
-        for (int32_t n : {64, 129, 1000, 4097}) {
-            Bytes v(n + 16);
-            for (auto &f : v) f = rng() % 3 == 0 ? 0 : static_cast<uint8_t>(rng());
-            const int64_t bytes = ((x + n + 7) >> 3) + 1;
-            Bytes bw(bytes, 0x5A), idx(bytes, 0x5A), gray(bytes, 0x5A);
-            ASSERT_EQ(BI_PackBWRow(v.data(), x, n, bw.data() + (x >> 3)), TS_OK);
-            ASSERT_EQ(BI_PackIndexRow(1, v.data(), x, n, idx.data() + (x >> 3)), TS_OK);
-            ASSERT_EQ(BI_PackGRow(1, v.data(), static_cast<int8_t>(x), n, gray.data() + (x >> 3)), TS_OK);
-            for (int64_t p = 0; p < bytes * 8; ++p) {
-                const bool in = p >= x && p < x + n;
-                const int old = (0x5A >> (7 - (p & 7))) & 1;
-                const int bit = (bw[p >> 3] >> (7 - (p & 7))) & 1;
-                ASSERT_EQ(bit, in ? v[p - x] != 0 : old) << x << " " << n << " " << p;
-                ASSERT_EQ((idx[p >> 3] >> (7 - (p & 7))) & 1, in ? v[p - x] != 0 : old);
-                ASSERT_EQ((gray[p >> 3] >> (7 - (p & 7))) & 1, in ? v[p - x] > 127 : old);
+    tstest::ForEachVectorPath([] {
+        std::mt19937 rng(5);
+        for (int32_t x : {0, 3, 8, 13}) {
+            for (int32_t n : {64, 129, 1000, 4097}) {
+                Bytes v(n + 16);
+                for (auto &f : v) f = rng() % 3 == 0 ? 0 : static_cast<uint8_t>(rng());
+                const int64_t bytes = ((x + n + 7) >> 3) + 1;
+                Bytes bw(bytes, 0x5A), idx(bytes, 0x5A), gray(bytes, 0x5A);
+                ASSERT_EQ(BI_PackBWRow(v.data(), x, n, bw.data() + (x >> 3)), TS_OK);
+                ASSERT_EQ(BI_PackIndexRow(1, v.data(), x, n, idx.data() + (x >> 3)), TS_OK);
+                ASSERT_EQ(BI_PackGRow(1, v.data(), static_cast<int8_t>(x), n, gray.data() + (x >> 3)), TS_OK);
+                for (int64_t p = 0; p < bytes * 8; ++p) {
+                    const bool in = p >= x && p < x + n;
+                    const int old = (0x5A >> (7 - (p & 7))) & 1;
+                    const int bit = (bw[p >> 3] >> (7 - (p & 7))) & 1;
+                    ASSERT_EQ(bit, in ? v[p - x] != 0 : old) << x << " " << n << " " << p;
+                    ASSERT_EQ((idx[p >> 3] >> (7 - (p & 7))) & 1, in ? v[p - x] != 0 : old);
+                    ASSERT_EQ((gray[p >> 3] >> (7 - (p & 7))) & 1, in ? v[p - x] > 127 : old);
+                }
+                Bytes back(n + 16, 9);
+                ASSERT_EQ(BI_UnpackBWRow(bw.data() + (x >> 3), x, n, back.data()), TS_OK);
+                for (int32_t i = 0; i < n; ++i) ASSERT_EQ(back[i], v[i] != 0);
+                EXPECT_EQ(back[n], 9);
             }
-            Bytes back(n + 16, 9);
-            ASSERT_EQ(BI_UnpackBWRow(bw.data() + (x >> 3), x, n, back.data()), TS_OK);
-            for (int32_t i = 0; i < n; ++i) ASSERT_EQ(back[i], v[i] != 0);
-            EXPECT_EQ(back[n], 9);
         }
-    }
+    });
 }
 
 }  // namespace

@@ -12,6 +12,7 @@
 #include "color/device_tables.h"
 #include "color/gamma_tables.h"
 #include "color/swop_cmyk_paths.h"
+#include "vector_paths.h"
 
 namespace {
 using namespace tessarine::color;
@@ -393,10 +394,18 @@ TEST(SwopCmykToSRgb, EveryBlackGivesTheFormulaBytes) {
 TEST(SwopCmykToSRgb, BothPathsGiveTheFormulaBytes) {
     // The exported function takes one of them; check each on its own.
     ExpectFormulaBytes(SwopCmykToSRgbScalar, Range(0, 255, 15), Range(0, 255, 3));
-    if (!HasAvx2()) GTEST_SKIP() << "no AVX2 on this processor";
+    if (tessarine::ProcessorVectorPath() < tessarine::VectorPath::kWide)
+        GTEST_SKIP() << "no AVX2 on this processor";
     ExpectFormulaBytes([](const uint8_t *cmyk, uint8_t *rgb) {
         SwopCmykToSRgbAvx2(cmyk, rgb, CX_CmykGammaTable());
     }, Range(0, 255, 5), {0, 1, 64, 127, 128, 200, 254, 255});
+}
+
+TEST(SwopCmykToSRgb, EveryVectorPathGivesTheFormulaBytes) {
+    // The exported function under each cap, the plain one included.
+    tstest::ForEachVectorPath([] {
+        ExpectFormulaBytes(CX_SWOPCmyk2SRgb, Range(0, 255, 17), {0, 1, 128, 254, 255});
+    });
 }
 
 // ---- Lab to sRGB -------------------------------------------------------------------

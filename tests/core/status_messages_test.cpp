@@ -1,63 +1,42 @@
 // Status texts through the message sink, the free-text message box, and the
 // entry points that do nothing.
 #include <cstdint>
-#include <map>
+#include <iterator>
 #include <string>
 
 #include <gtest/gtest.h>
 
 #include <tessarine/core.h>
 
+#include "core/status.h"
 #include "test_support.h"
 
 namespace {
 
-const std::map<int32_t, std::string> kTexts = {
-    {16384, "Error detected; operation aborted."},
-    {16385, "Functionality not yet supported."},
-    {16386, "Not enough memory."},
-    {16387, "Open paths will not be processed."},
-    {16388, "Option does not exist"},
-    {16389, "No object found."},
-    {16390, "Input number is too large."},
-    {16391, "System database failed."},
-    {16392, "Offset distance too large."},
-    {16393, "The gap is too big."},
-    {16394, "Try a simpler case."},
-    {16395, "Only one color will be processed."},
-    {16396, "Input must be between 0% and 100%."},
-    {16397, "Logic error detected, operation aborted."},
-    {16398, "No object selected."},
-    {16399, "Device not supported."},
-    {16400, "Substrate not supported."},
-    {16401, "Ink not supported."},
-    {16402, "Only black and white image allowed."},
-    {16403, "No image selected."},
-    {16404, "Not enough memory to RIP."},
-    {16405, "Not enough disk space."},
-    {16406, "Failed to access bitmap."},
-    {16407, "Object too small to print."},
-    {16408, "Resource not found."},
-    {16409, "Failed in doing rasterization."},
-    {16410, "Failed to communicate with Jobyard."},
-    {16411, "Stack overflow."},
-    {16415, "Not enough memory to bitmap."},
-};
+using tessarine::kStatusTable;
+using tessarine::StatusText;
 
-// Status to text id; statuses missing here below 1 show the general text.
-const std::map<int32_t, int32_t> kOwnRows = {
-    {-2, 16385},  {-5, 16386},  {-8, 16387},  {-9, 16388},  {-10, 16389}, {-11, 16390},
-    {-12, 16391}, {-17, 16392}, {-20, 16393}, {-21, 16394}, {-23, 16415}, {-24, 16395},
-    {-25, 16396}, {-26, 16397}, {-28, 16398}, {-31, 16399}, {-32, 16400}, {-33, 16401},
-    {-35, 16402}, {-36, 16403}, {-37, 16404}, {-38, 16405}, {-50, 16406}, {-52, 16407},
-    {-53, 16408}, {-54, 16409}, {-55, 16410}, {-56, 16411},
-};
+// The row of a status in the library's table, or null.
+const StatusText *RowOf(int32_t status) {
+    for (const StatusText &row : kStatusTable)
+        if (tessarine::status_table::IsListed(row) && row.status == status) return &row;
+    return nullptr;
+}
 
-// The id shown for a status, or 0 for nothing.
+// The text the table gives an id.
+std::string TextOf(int32_t id) {
+    for (const StatusText &row : kStatusTable)
+        if (row.textId == id && row.text != nullptr) return row.text;
+    ADD_FAILURE() << "no text " << id;
+    return {};
+}
+
+// The id shown for a status, or 0 for nothing: a status above 0 is silent,
+// a listed one shows its row's text (or nothing), the rest the general text.
 int32_t ExpectedId(int32_t status) {
-    if (status > 0 || status == -18 || status == -34) return 0;
-    auto row = kOwnRows.find(status);
-    return row != kOwnRows.end() ? row->second : 16384;
+    if (status > 0) return 0;
+    if (const StatusText *row = RowOf(status)) return row->textId;
+    return 16384;
 }
 
 void ExpectShows(tstest::MessageCapture &capture, int32_t argument, int32_t id) {
@@ -70,7 +49,7 @@ void ExpectShows(tstest::MessageCapture &capture, int32_t argument, int32_t id) 
     ASSERT_EQ(capture.Messages().size(), 1u) << "status " << argument;
     const tstest::CapturedMessage &m = capture.Messages()[0];
     EXPECT_EQ(m.id, id) << "status " << argument;
-    EXPECT_EQ(m.text, kTexts.at(id)) << "status " << argument;
+    EXPECT_EQ(m.text, TextOf(id)) << "status " << argument;
     EXPECT_EQ(m.style, 0u) << "status " << argument;
 }
 
@@ -88,6 +67,7 @@ TEST(ShowStatusMsg, PositiveStatusesShowNothing) {
 TEST(ShowStatusMsg, ZeroShowsGeneralText) {
     tstest::MessageCapture capture;
     ExpectShows(capture, 0, 16384);
+    EXPECT_EQ(capture.Messages()[0].text, "Error detected; operation aborted.");
 }
 
 TEST(ShowStatusMsg, UnlistedCodesShowGeneralText) {
@@ -105,6 +85,30 @@ TEST(ShowStatusMsg, SilentCodes) {
 TEST(ShowStatusMsg, MinusTwentyThreeShowsText16415) {
     tstest::MessageCapture capture;
     ExpectShows(capture, -23, 16415);
+    EXPECT_EQ(capture.Messages()[0].text, "Not enough memory to bitmap.");
+}
+
+TEST(StatusTable, CodesAndTextsAsPublished) {
+    // The table's edges and the rows that break the order of the ids.
+    EXPECT_EQ(tessarine::kFirstTextId, 16384);
+    EXPECT_EQ(tessarine::kLastTextId, 16415);
+    EXPECT_EQ(tessarine::kGeneralTextId, 16384);
+    EXPECT_EQ(tessarine::kLowestListedStatus, -56);
+    EXPECT_EQ(tessarine::kHighestListedStatus, -2);
+    EXPECT_EQ(std::size(kStatusTable), 34u);
+    ASSERT_NE(RowOf(-2), nullptr);
+    EXPECT_EQ(RowOf(-2)->textId, 16385);
+    EXPECT_STREQ(RowOf(-5)->text, "Not enough memory.");
+    EXPECT_EQ(RowOf(-23)->textId, 16415);
+    EXPECT_EQ(RowOf(-24)->textId, 16395);
+    EXPECT_STREQ(RowOf(-50)->text, "Failed to access bitmap.");
+    EXPECT_STREQ(RowOf(-56)->text, "Stack overflow.");
+    EXPECT_EQ(RowOf(-18)->textId, tessarine::kNoText);
+    EXPECT_EQ(RowOf(-34)->textId, tessarine::kNoText);
+    for (int32_t unlisted : {-1, -3, -4, -6, -14, -29, -40}) EXPECT_EQ(RowOf(unlisted), nullptr);
+    EXPECT_EQ(TextOf(16412), "Unexpected NULL pointer.");
+    EXPECT_EQ(TextOf(16413), "Degenerated input.");
+    EXPECT_EQ(TextOf(16414), "Wrong input.");
 }
 
 TEST(ShowStatusMsg, OnlyTheLowSixteenBitsCount) {
@@ -126,7 +130,8 @@ TEST(ShowStatusMsg, WithoutSatelliteTextsAreBuiltIn) {
     // The test program has no satellite beside it: every text is the
     // library's own.
     tstest::MessageCapture capture;
-    for (const auto &[status, id] : kOwnRows) ExpectShows(capture, status, id);
+    for (const StatusText &row : kStatusTable)
+        if (tessarine::status_table::IsListed(row)) ExpectShows(capture, row.status, row.textId);
 }
 
 int32_t g_sinkResult = 0;

@@ -124,12 +124,22 @@ TEST(CurveArcNodes, NonFiniteInputWritesNothing) {
     for (double v : bad) {
         for (int which = 0; which < 3; ++which) {
             Nodes n;
-            ConvertArcToBezier(which == 0 ? v : 1, 0, 0, which == 1 ? v : 0,
-                               which == 2 ? v : 1, n.p, &n.count);
+            ConvertArcToBezier(which == 0 ? v : 1, 0, 0, which == 1 ? v : 0, which == 2 ? v : 1,
+                               n.p, &n.count);
             EXPECT_EQ(n.count, 0);
             EXPECT_EQ(n.p[0].x, kSentinel);
         }
     }
+    Nodes endless;
+    ConvertArcToBezier(-2, 0, 0, 0, -1, endless.p, &endless.count);
+    EXPECT_EQ(endless.count, 0) << "a negative radius and sweep never pass the length test";
+    EXPECT_EQ(endless.p[0].x, kSentinel);
+    Nodes once;
+    ConvertArcToBezier(-2, 0, 0, 0, 3, once.p, &once.count);
+    EXPECT_EQ(once.count, 6) << "a negative radius with a sweep above a quarter stops at once";
+    Nodes small;
+    ConvertArcToBezier(-2, 0, 0, 0, 1, small.p, &small.count);
+    EXPECT_EQ(small.count, 0) << "below a quarter the rest is negative: endless again";
     Nodes huge;
     ConvertArcToBezier(1, 0, 0, 0, 1e300, huge.p, &huge.count);
     EXPECT_EQ(huge.count, 0) << "a sweep that whole turns cannot bring down";
@@ -151,7 +161,7 @@ struct Spline {
 };
 
 void RunSpline(Spline &s, const double *x, const double *y, int16_t n, double stx = 0,
-         double sty = 0, double etx = 0, double ety = 0) {
+               double sty = 0, double etx = 0, double ety = 0) {
     s.status = ArcToBezier(x, y, n, stx, sty, etx, ety, &s.x, &s.y, &s.count);
 }
 
@@ -230,7 +240,8 @@ TEST_F(CurveSpline, InterpolatesItsPointsAndJoinsSmoothly) {
 }
 
 TEST_F(CurveSpline, ThreePointEndRuleUsesTwoThirdsAsWritten) {
-    const double x[] = {0.1, 1.7, 4.3}, y[] = {0.3, 2.9, 0.7};
+    // Points where 2.0 / 3.0 x v and 2 v / 3 round apart in both x and y.
+    const double x[] = {5.2, 7.4, 6.7}, y[] = {0.6, 7.6, 5.9};
     Spline s;
     RunSpline(s, x, y, 3);
     ASSERT_EQ(s.status, 10);
@@ -245,6 +256,22 @@ TEST_F(CurveSpline, ThreePointEndRuleUsesTwoThirdsAsWritten) {
     };
     EXPECT_EQ(s.x[1], rule(x[0], x[1], x[2]));
     EXPECT_EQ(s.y[1], rule(y[0], y[1], y[2]));
+    auto other = [&](double A, double B, double C) {
+        const double q = (B - alpha * alpha * A - beta * beta * C) / (2 * alpha * beta);
+        return A / 3 + 2 * (beta * q + alpha * A) / 3;
+    };
+    EXPECT_NE(s.x[1], other(x[0], x[1], x[2])) << "the data tells the two roundings apart";
+}
+
+TEST_F(CurveSpline, LengthsAreDistancesThatVanishBelowTheTolerance) {
+    // |W[2] - W[0]| runs to the origin here and is below 1e-8: Distance gives
+    // 0, so the start handle lies on the start point.
+    const double x[] = {1e-9, 5}, y[] = {0, 0};
+    Spline s;
+    RunSpline(s, x, y, 2, 1, 0, 1, 0);
+    ASSERT_EQ(s.status, 10);
+    EXPECT_EQ(s.x[1], 1e-9);
+    EXPECT_EQ(s.y[1], 0);
 }
 
 TEST_F(CurveSpline, ZeroFirstOrLastChordGivesZeroAndWritesNothing) {
@@ -398,8 +425,8 @@ TEST(CurveExtent, TableCasesAndNegativeSweep) {
 
 TEST(CurveSplit, SubDivideBezierWritesTheHalvesInItsOrder) {
     double v[10];
-    SubDivideBezier(0, 0, 1, 2, 3, 2, 4, 0, 0.25, &v[0], &v[1], &v[2], &v[3], &v[4], &v[5],
-                    &v[6], &v[7], &v[8], &v[9]);
+    SubDivideBezier(0, 0, 1, 2, 3, 2, 4, 0, 0.25, &v[0], &v[1], &v[2], &v[3], &v[4], &v[5], &v[6],
+                    &v[7], &v[8], &v[9]);
     auto lerp = [](double a, double b, double t) { return (b - a) * t + a; };
     const double l1x = lerp(0, 1, 0.25), qx = lerp(1, 3, 0.25), r2x = lerp(3, 4, 0.25);
     const double l2x = lerp(l1x, qx, 0.25), r1x = lerp(qx, r2x, 0.25);

@@ -18,15 +18,15 @@ inline constexpr double kTurn = 6.283185307179586;
 inline constexpr double kSentinel = -12345.678;
 inline constexpr int16_t kSentinel16 = 777;
 
-inline BZ_Point Pt(double x, double y) { return BZ_Point{x, y}; }
+inline BZ_Point Pt(double x, double y) {
+    return BZ_Point{x, y};
+}
 
 // Curves as the eight doubles the intersection entry points take.
 struct Cubic {
     double v[8];
     BZ_Point P(int i) const { return BZ_Point{v[2 * i], v[2 * i + 1]}; }
-    Cubic Reversed() const {
-        return Cubic{{v[6], v[7], v[4], v[5], v[2], v[3], v[0], v[1]}};
-    }
+    Cubic Reversed() const { return Cubic{{v[6], v[7], v[4], v[5], v[2], v[3], v[0], v[1]}}; }
 };
 
 // The point at t by de Casteljau, written out independently of the library.
@@ -58,7 +58,9 @@ inline Cubic SubCurve(const Cubic &c, double t0, double t1) {
     return Cubic{{q0.x, q0.y, q1.x, q1.y, q2.x, q2.y, q3.x, q3.y}};
 }
 
-inline double Dist(BZ_Point a, BZ_Point b) { return std::hypot(a.x - b.x, a.y - b.y); }
+inline double Dist(BZ_Point a, BZ_Point b) {
+    return std::hypot(a.x - b.x, a.y - b.y);
+}
 
 // Least distance from p to the curve, by dense sampling and a local polish.
 inline double DistanceToCurve(const Cubic &c, BZ_Point p) {
@@ -71,13 +73,40 @@ inline double DistanceToCurve(const Cubic &c, BZ_Point p) {
     double lo = std::fmax(0, bestT - 1 / 2000.0), hi = std::fmin(1, bestT + 1 / 2000.0);
     for (int i = 0; i < 100; ++i) {
         const double m1 = lo + (hi - lo) / 3, m2 = hi - (hi - lo) / 3;
-        if (Dist(PointAt(c, m1), p) < Dist(PointAt(c, m2), p)) hi = m2;
-        else lo = m1;
+        if (Dist(PointAt(c, m1), p) < Dist(PointAt(c, m2), p))
+            hi = m2;
+        else
+            lo = m1;
     }
     return std::fmin(best, Dist(PointAt(c, 0.5 * (lo + hi)), p));
 }
 
 // The sandbox checks heap blocks left behind after every test.
 class CurveTest : public tstest::Sandbox {};
+
+}  // namespace gtest_curves
+
+namespace gtest_curves {
+
+// The result arrays of a curve pair, pre-filled with sentinels.
+struct Hits {
+    double tA[14], tB[14];
+    BZ_Point pts[14];
+    uint16_t count = 999;
+    int16_t kind = kSentinel16;
+    int32_t status = 0;
+    Hits() {
+        for (int i = 0; i < 14; ++i) {
+            tA[i] = tB[i] = kSentinel;
+            pts[i] = Pt(kSentinel, kSentinel);
+        }
+    }
+};
+
+inline Hits CurvePair(const Cubic &a, const Cubic &b, double tol) {
+    Hits h;
+    h.status = NewCurveCurveIntersect(a.v, b.v, h.tA, h.tB, h.pts, &h.count, tol, &h.kind);
+    return h;
+}
 
 }  // namespace gtest_curves

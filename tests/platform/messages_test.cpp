@@ -2,6 +2,7 @@
 
 #include <tessarine/core.h>
 
+#include "core/status.h"
 #include "platform/heap.h"
 #include "platform/messages.h"
 #include "test_support.h"
@@ -18,6 +19,18 @@ TEST(StringTable, HoldsTheBuiltInTextsByIdAndNothingOutside) {
     EXPECT_STREQ(LoadString(16415), "Not enough memory to bitmap.");
     EXPECT_EQ(LoadString(16383), nullptr);
     EXPECT_EQ(LoadString(16416), nullptr);
+}
+
+TEST(StringTable, EveryTextOfTheStatusTableUnderItsId) {
+    int32_t texts = 0;
+    for (const tessarine::StatusText &row : tessarine::kStatusTable) {
+        if (row.text == nullptr) continue;
+        EXPECT_STREQ(LoadString(row.textId), row.text) << row.textId;
+        ++texts;
+    }
+    EXPECT_EQ(texts, tessarine::kLastTextId - tessarine::kFirstTextId + 1);
+    EXPECT_EQ(LoadString(tessarine::kFirstTextId - 1), nullptr);
+    EXPECT_EQ(LoadString(tessarine::kLastTextId + 1), nullptr);
 }
 
 TEST(MessageSink, FrameworkBoxPassesIdStyleAndText) {

@@ -10,3 +10,4 @@ void DemoColor();
 void DemoTiles();
 void DemoBlockFile();
 void DemoRows();
+void DemoMovers();

@@ -68,5 +68,6 @@ int main() {
     DemoTiles();
     DemoBlockFile();
     DemoRows();
+    DemoMovers();
     return 0;
 }
