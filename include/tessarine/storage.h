@@ -103,10 +103,9 @@ typedef struct HVT_FileInfo {
     int32_t writeRowBytes;
     int32_t bandRowBytes;
     int32_t bandRows;
-    /* Library-private: the rows of readBox read from the file so far. A band
-       of a read-only session is read in slices as its rows are asked for. */
-    int32_t bandReadTop;
-    int32_t bandReadBottom;
+    /* Library-private: nonzero while tileBuffer has still to be given the
+       bytes the session's last band read leaves in it. */
+    uint8_t tileBufferOwed;
 } HVT_FileInfo;
 
 TESSARINE_API int32_t HVT_CreateBlankTileBmpFile(uint8_t imageType, uint8_t bitsPerPixel,
@@ -129,7 +128,15 @@ TESSARINE_API int32_t HVT_ReadTile(uint8_t sub, HVT_FileInfo *info, int32_t tile
                                    int32_t rowCount, void *buffer);
 TESSARINE_API int32_t HVT_PixelInWhichTile(int32_t tilesAcross, int32_t x, int32_t y);
 
-/* ---- Tile block transfer ----------------------------------------------------- */
+/* ---- Tile block transfer -----------------------------------------------------
+   A box's rows go between the caller's buffer, stride bytes apart (0 for a
+   box of one row), and the sub-bitmap's tiles. The plain forms move whole
+   bytes. Below 8 bits per pixel the two bit-shift forms expect the box's
+   first pixel at different places of a buffer row:
+   - HVT_ReadBlockWithBitShift delivers it at the top bit of the row's first
+     byte, and finishes that byte from the tile data;
+   - HVT_SaveBlockWithBitShift takes it where it sits in a byte of a full
+     image row: at bit (left * bitsPerPixel) mod 8, counted from the top. */
 
 TESSARINE_API int32_t HVT_SaveBlock(uint8_t sub, HVT_FileInfo *info, const HVT_Box *box,
                                     int32_t stride, const void *buffer);

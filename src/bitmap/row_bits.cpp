@@ -58,7 +58,7 @@ void ShiftBytesLeft(const uint8_t *in, int64_t n, int r, uint8_t *out) {
         }
         const int back = 8 - r;
 #ifdef TESSARINE_SHUFFLE_PATH
-        if (n >= 64 && HasWideShuffle()) k = ShiftBytesLeftWide(in, n, r, out);
+        if (n >= 64 && ActiveVectorPath() >= VectorPath::kWide) k = ShiftBytesLeftWide(in, n, r, out);
 #endif
         for (; k + 8 <= n; k += 8)
             StoreBE64(out + k, (LoadBE64(in + k) << r) | (uint64_t{in[k + 8]} >> back));

@@ -4,6 +4,8 @@
 
 #include <tessarine/core.h>
 
+#include "core/rect_ops.h"
+
 namespace {
 
 int32_t WrapAdd(int32_t a, int32_t b) {
@@ -12,10 +14,6 @@ int32_t WrapAdd(int32_t a, int32_t b) {
 
 int32_t WrapSub(int32_t a, int32_t b) {
     return static_cast<int32_t>(static_cast<uint32_t>(a) - static_cast<uint32_t>(b));
-}
-
-bool IsEmpty(const RECT &r) {
-    return !(r.left < r.right && r.top < r.bottom);
 }
 
 }  // namespace
@@ -27,15 +25,14 @@ TESSARINE_API void IM_SetRECT(int32_t left, int32_t top, int32_t right, int32_t 
 }
 
 TESSARINE_API int32_t IM_EmptyRECT(const RECT *rect) {
-    return IsEmpty(*rect) ? 1 : 0;
+    return tessarine::IsEmptyRect(*rect) ? 1 : 0;
 }
 
 // Out is written even when the intersection is empty.
 TESSARINE_API int32_t IM_FindRECTInt(const RECT *a, const RECT *b, RECT *out) {
-    const RECT r{std::max(a->left, b->left), std::max(a->top, b->top), std::min(a->right, b->right),
-                 std::min(a->bottom, b->bottom)};
+    const RECT r = tessarine::IntersectRect(*a, *b);
     *out = r;
-    return IsEmpty(r) ? 0 : 1;
+    return tessarine::IsEmptyRect(r) ? 0 : 1;
 }
 
 TESSARINE_API int32_t IM_IsRECTEnclosed(const RECT *inner, const RECT *outer) {

@@ -1,3 +1,8 @@
+// Scratch files: a fresh file of a unique name in the scratch directory
+// ($TMPDIR when it names a directory, else /tmp), created exclusively so that
+// no one else's file is ever taken; and the path copy with which the tile
+// and block files hand a path back (no bound: the name made here is checked
+// against the caller's field before it is copied).
 #include <cstring>
 
 #include "core/status.h"

@@ -81,7 +81,7 @@ int32_t OpenFileState(const char *path, int32_t openFile, HVT_FileInfo *info) {
         if (Failed(status)) return status;
         ts::DecodeSubbmpSlot(slot, info->subbmps[i]);
     }
-    const uint32_t tileBytes = (uint32_t{header.bitsPerPixel} << 23) >> 3;
+    const auto tileBytes = static_cast<uint32_t>(ts::TileBufferBytes(header.bitsPerPixel));
     info->tileBuffer = static_cast<uint8_t *>(MEM_AllocPtr(0, tileBytes));
     return info->tileBuffer == nullptr ? kErrMemory : kOk;
 }
@@ -240,6 +240,7 @@ TESSARINE_API void HVT_TileFileEnd(HVT_FileInfo *info, int32_t closeFile) {
     FreeSessionHandle(info->readHandle, info->readBuffer);
     FreeSessionHandle(info->writeHandle, info->writeBuffer);
     FreeField(info->tileBuffer);
+    info->tileBufferOwed = 0;
 }
 
 }  // extern "C"

@@ -62,6 +62,10 @@ inline bool UsableTile(const HVT_TileHdr &t, int32_t d) {
            (int64_t{t.left} * d) % 8 == 0;
 }
 
+// Bytes of a record's tileBuffer: one whole tile at the largest, 8192 by 1024
+// pixels of depth d.
+inline int64_t TileBufferBytes(int32_t d) { return (int64_t{d} << 23) >> 3; }
+
 // Row size of a tile in the file: packed to the byte.
 inline int64_t TileRowBytes(const HVT_TileHdr &t, int32_t d) {
     return ((int64_t{t.right} - t.left) * d + 7) >> 3;

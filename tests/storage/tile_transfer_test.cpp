@@ -1,3 +1,6 @@
+#include <fcntl.h>
+#include <unistd.h>
+
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -99,39 +102,54 @@ Expected ModelPlainRead(Model &m, const HVT_Box &b, const BoxBuffer &before) {
     return e;
 }
 
-Expected ModelShiftRead(Model &m, const HVT_Box &b, const BoxBuffer &before) {
-    Expected e{before.bytes, std::vector<uint8_t>(before.bytes.size(), 0xFF)};
-    const Clip c = ClipToImage(b, m);
-    if (c.Empty()) return e;
-    const int64_t d = m.d;
-    for (int64_t y = c.top; y < c.bottom; ++y) {
-        uint8_t *row = e.bytes.data() + (y - b.top) * before.stride;
-        uint8_t *care = e.care.data() + (y - b.top) * before.stride;
-        for (int64_t tl = 0; tl < m.w; tl += 8192) {
-            const int64_t tr = std::min<int64_t>(tl + 8192, m.w);
-            const int64_t il = std::max<int64_t>(b.left, tl), ir = std::min<int64_t>(b.right, tr);
-            if (il >= ir) continue;
-            const int64_t to = (il - b.left) * d, bits = (ir - il) * d;
-            for (int64_t k = 0; k < bits; ++k) {
-                SetBit(row, to + k, GetBit(m.Row(y), il * d + k));
-                SetBit(care, to + k, 1);
-            }
-            const int64_t phase = to & 7;
-            if (phase + bits < 8) {  // the first byte is finished from the source
-                const int64_t rowEnd = (tl * d / 8 + ((tr - tl) * d + 7) / 8) * 8;
-                for (int64_t k = bits; k < 8 - phase; ++k) {
-                    const int64_t at = il * d + k;
-                    SetBit(care, to + k, 1);
-                    if (at < tr * d)
-                        SetBit(row, to + k, GetBit(m.Row(y), at));
-                    else if (at < rowEnd)
-                        SetBit(care, to + k, 0);
-                    else
-                        SetBit(row, to + k, 0);
-                }
-            }
+// tileBuffer as the text's walk leaves it: each tile's rows of the box at its
+// start, T bytes apart, taken from the file as it stands after the transfer.
+struct TileBufferModel {
+    int fd;
+    std::vector<uint8_t> bytes;
+    TileBufferModel(const char *path, int32_t d)
+        : fd(::open(path, O_RDONLY)), bytes(static_cast<size_t>(d) << 20) {}
+    ~TileBufferModel() { ::close(fd); }
+    // Calls perTile(tile, I, T) after laying each tile's rows down, in the
+    // order of the walk.
+    template <class PerTile>
+    void Walk(HVT_FileInfo *info, uint8_t sub, const HVT_Box &b, int32_t d, PerTile &&perTile) {
+        const HVT_SubbmpSlot &slot = info->subbmps[sub];
+        for (int32_t i = 0; i < slot.tilesAcross * slot.tilesDown; ++i) {
+            const HVT_TileHdr &t = slot.tileHdrs[i];
+            const HVT_Box I{std::max(t.left, b.left), std::max(t.top, b.top),
+                            std::min(t.right, b.right), std::min(t.bottom, b.bottom)};
+            if (I.left >= I.right || I.top >= I.bottom) continue;
+            const int64_t T = (int64_t{t.right - t.left} * d + 7) / 8;
+            const int64_t n = T * (I.bottom - I.top);
+            EXPECT_EQ(::pread(fd, bytes.data(), static_cast<size_t>(n), t.offset + T * (I.top - t.top)), n);
+            perTile(t, I, T);
         }
     }
+    void Walk(HVT_FileInfo *info, uint8_t sub, const HVT_Box &b, int32_t d) {
+        Walk(info, sub, b, d, [](const HVT_TileHdr &, const HVT_Box &, int64_t) {});
+    }
+    int Bit(int64_t at) const {
+        return at < int64_t(bytes.size()) * 8 ? GetBit(bytes.data(), at) : 0;
+    }
+};
+
+// The span's pixels from the model; the bits that finish a first byte behind
+// a short span from tileBuffer as it lies (the rest of the tile row, then the
+// next row in the buffer, and nothing past its end).
+Expected ModelShiftRead(Model &m, const HVT_Box &b, const BoxBuffer &before, TileBufferModel &tb,
+                        HVT_FileInfo *info, uint8_t sub) {
+    Expected e{before.bytes, std::vector<uint8_t>(before.bytes.size(), 0xFF)};
+    const int64_t d = m.d;
+    tb.Walk(info, sub, b, m.d, [&](const HVT_TileHdr &t, const HVT_Box &I, int64_t T) {
+        for (int64_t y = I.top; y < I.bottom; ++y) {
+            uint8_t *row = e.bytes.data() + (y - b.top) * before.stride;
+            const int64_t to = (int64_t{I.left} - b.left) * d, bits = int64_t{I.right - I.left} * d;
+            for (int64_t k = 0; k < bits; ++k) SetBit(row, to + k, GetBit(m.Row(y), I.left * d + k));
+            const int64_t from = (y - I.top) * T * 8 + (int64_t{I.left} - t.left) * d;
+            for (int64_t k = bits; k < 8 - (to & 7); ++k) SetBit(row, to + k, tb.Bit(from + k));
+        }
+    });
     return e;
 }
 
@@ -209,6 +227,9 @@ class TileTransferModel : public tstest::Sandbox, public ::testing::WithParamInt
 
 void Exercise(TileFile &f, uint8_t sub, Model &m, std::mt19937 &rng, int rounds) {
     HVT_FileInfo *info = f.Info();
+    TileBufferModel tb(f.Path(), m.d);
+    // What the buffer holds before the first transfer is the allocator's.
+    std::memset(info->tileBuffer, 0, tb.bytes.size());
     const int32_t d = m.d;
     // Fill the whole sub-bitmap first, so that nothing depends on unwritten bytes.
     {
@@ -224,6 +245,7 @@ void Exercise(TileFile &f, uint8_t sub, Model &m, std::mt19937 &rng, int rounds)
         ASSERT_EQ(HVT_SaveBlock(sub, info, &all, static_cast<int32_t>(m.rowBytes), pixels.data()),
                   TS_OK);
         m.bytes = pixels;
+        tb.Walk(info, sub, all, d);
     }
     for (int i = 0; i < rounds; ++i) {
         HVT_Box b = RandomBox(rng, m.w, m.h);
@@ -248,11 +270,19 @@ void Exercise(TileFile &f, uint8_t sub, Model &m, std::mt19937 &rng, int rounds)
             }
             default: {
                 const bool plain = d >= 8 || (int64_t{b.left} * d) % 8 == 0;
-                const Expected e = plain ? ModelPlainRead(m, b, buf) : ModelShiftRead(m, b, buf);
+                if (plain) {
+                    const Expected e = ModelPlainRead(m, b, buf);
+                    ASSERT_EQ(HVT_ReadBlockWithBitShift(sub, info, &b, stride, buf.bytes.data()), TS_OK);
+                    ExpectBuffer(e, buf, "bit-shift read", b);
+                    break;
+                }
+                ASSERT_EQ(HVT_GetSubbmpTileHdrs(sub, info), TS_OK);
+                const Expected e = ModelShiftRead(m, b, buf, tb, info, sub);
                 ASSERT_EQ(HVT_ReadBlockWithBitShift(sub, info, &b, stride, buf.bytes.data()), TS_OK);
                 ExpectBuffer(e, buf, "bit-shift read", b);
             }
         }
+        tb.Walk(info, sub, b, d);
         if (::testing::Test::HasFailure()) return;
     }
     ExpectFileMatches(f, sub, m);
@@ -513,6 +543,199 @@ TEST_F(TileTransfer, EveryFailureStopsTheWalkWithItsStatus) {
             for (FileCall k : {FileCall::Read, FileCall::Seek}) check(fn, *box, k);
         for (Fn fn : saves)
             for (FileCall k : {FileCall::Read, FileCall::Write, FileCall::Seek}) check(fn, *box, k);
+    }
+}
+
+// ---- The shifted read finishes a first byte from tileBuffer as it lies ---------------
+
+class ShiftedRead : public tstest::Sandbox {
+  protected:
+    // A 16 by 15 one-bit indexed image: byte 0 of row y is 0x10 * (y & 15) | 3,
+    // byte 1 is 0xA0 | y.
+    static uint8_t Byte0(int y) { return static_cast<uint8_t>(0x10 * (y & 15) | 3); }
+    static uint8_t Byte1(int y) { return static_cast<uint8_t>(0xA0 | y); }
+    static void FillSmall(TileFile &f) {
+        std::vector<uint8_t> image(30);
+        for (int y = 0; y < 15; ++y) {
+            image[2 * y] = Byte0(y);
+            image[2 * y + 1] = Byte1(y);
+        }
+        const HVT_Box all{0, 0, 16, 15};
+        ASSERT_EQ(HVT_SaveBlock(0, f.Info(), &all, 2, image.data()), TS_OK);
+    }
+};
+
+// Save (0,4)-(5,11), then read (12,4)-(16,9): the low four bits of each first
+// byte are the first pixels of the next row in the buffer, for the last row
+// read too (row 9, left there by the save).
+TEST_F(ShiftedRead, ShortSpanTakesTheNextRowInTheBuffer) {
+    const uint8_t colors[6] = {0, 0, 0, 255, 255, 255};
+    TileFile f(1, 16, 15, 3, 1, 2, colors);
+    ASSERT_EQ(f.Status(), TS_OK);
+    FillSmall(f);
+    const HVT_Box save{0, 4, 5, 11};
+    const uint8_t saved[7] = {0x9F, 0x2E, 0xC1, 0x77, 0x58, 0xE4, 0x3B};
+    ASSERT_EQ(HVT_SaveBlock(0, f.Info(), &save, 1, saved), TS_OK);
+    auto firstByte = [&](int y) { return y >= 4 && y < 11 ? saved[y - 4] : Byte0(y); };
+    const HVT_Box read{12, 4, 16, 9};
+    uint8_t out[5] = {};
+    ASSERT_EQ(HVT_ReadBlockWithBitShift(0, f.Info(), &read, 1, out), TS_OK);
+    for (int y = 4; y < 9; ++y)
+        EXPECT_EQ(out[y - 4], ((Byte1(y) & 0x0F) << 4) | (firstByte(y + 1) >> 4)) << y;
+}
+
+// The same after transfers that go between the file and the caller without
+// a copy: the buffer still holds what the text's walk leaves in it.
+TEST_F(ShiftedRead, WholeRowTransfersLeaveTheirRowsInTheBuffer) {
+    TileFile f(1, 16, 15);
+    ASSERT_EQ(f.Status(), TS_OK);
+    FillSmall(f);
+    // A save of whole rows 4 to 11.
+    uint8_t rows[16];
+    for (int i = 0; i < 16; ++i) rows[i] = static_cast<uint8_t>(0x5C + 29 * i);
+    const HVT_Box whole{0, 4, 16, 12};
+    ASSERT_EQ(HVT_SaveBlock(0, f.Info(), &whole, 2, rows), TS_OK);
+    const HVT_Box read{12, 4, 16, 9};
+    uint8_t out[5] = {};
+    ASSERT_EQ(HVT_ReadBlockWithBitShift(0, f.Info(), &read, 1, out), TS_OK);
+    for (int y = 4; y < 9; ++y)
+        EXPECT_EQ(out[y - 4], ((rows[2 * (y - 4) + 1] & 0x0F) << 4) | (rows[2 * (y - 3)] >> 4)) << y;
+    // A read of all 15 rows, then a shifted read of rows 2 to 5: behind row 5
+    // the buffer holds row 4 of the earlier read.
+    FillSmall(f);
+    std::vector<uint8_t> all(30);
+    const HVT_Box image{0, 0, 16, 15};
+    ASSERT_EQ(HVT_ReadBlock(0, f.Info(), &image, 2, all.data()), TS_OK);
+    const HVT_Box upper{12, 2, 16, 6};
+    ASSERT_EQ(HVT_ReadBlockWithBitShift(0, f.Info(), &upper, 1, out), TS_OK);
+    for (int y = 2; y < 5; ++y)
+        EXPECT_EQ(out[y - 2], ((Byte1(y) & 0x0F) << 4) | (Byte0(y + 1) >> 4)) << y;
+    EXPECT_EQ(out[3], ((Byte1(5) & 0x0F) << 4) | (Byte0(4) >> 4));
+}
+
+// Past the end of the buffer there is nothing to take: a full one-bit tile
+// fills it, and its last row's short span is finished with zeros.
+TEST_F(ShiftedRead, NothingIsTakenPastTheEndOfTheBuffer) {
+    TileFile f(1, 8192, 1024);
+    ASSERT_EQ(f.Status(), TS_OK);
+    std::vector<uint8_t> image(1024 * 1024, 0xFF);
+    for (int y = 0; y < 1024; ++y) image[int64_t{y} * 1024] = static_cast<uint8_t>(y * 37 | 0x80);
+    const HVT_Box all{0, 0, 8192, 1024};
+    ASSERT_EQ(HVT_SaveBlock(0, f.Info(), &all, 1024, image.data()), TS_OK);
+    const HVT_Box read{8189, 0, 8192, 1024};
+    std::vector<uint8_t> out(1024, 0xFF);
+    ASSERT_EQ(HVT_ReadBlockWithBitShift(0, f.Info(), &read, 1, out.data()), TS_OK);
+    for (int y = 0; y < 1023; ++y)
+        ASSERT_EQ(out[y], 0xE0 | (image[int64_t{y + 1} * 1024] >> 3)) << y;
+    EXPECT_EQ(out[1023], 0xE0);
+}
+
+// Every source phase and every span that ends inside the first byte, with
+// destination phases from a second tile column, on the last row of a tile,
+// the rows before it and the last row read, at 1 and 4 bits per pixel.
+TEST_F(ShiftedRead, EveryPhaseAndShortSpanAgainstTheText) {
+    for (int32_t d : {1, 4}) {
+        const int32_t w = 8192 + 5, h = 1030;
+        TileFile f(static_cast<uint8_t>(d), w, h);
+        ASSERT_EQ(f.Status(), TS_OK);
+        Model m(w, h, d);
+        uint32_t x = 0x9E3779B9u;
+        for (auto &v : m.bytes) {
+            x = x * 1664525u + 1013904223u;
+            v = static_cast<uint8_t>(x >> 24);
+        }
+        const HVT_Box all{0, 0, w, h};
+        ASSERT_EQ(HVT_SaveBlock(0, f.Info(), &all, static_cast<int32_t>(m.rowBytes), m.bytes.data()),
+                  TS_OK);
+        TileBufferModel tb(f.Path(), d);
+        tb.Walk(f.Info(), 0, all, d);
+        std::mt19937 rng(d);
+        const int32_t per = 8 / d;
+        const int32_t rowRanges[][2] = {{1019, 1024}, {1, 6}, {1024, 1030}, {1020, 1027}};
+        int cases = 0;
+        for (const auto &rows : rowRanges) {
+            for (int32_t left = 1; left < 2 * per; ++left) {
+                if (left % per == 0) continue;
+                // In the first tile column: spans of 1 pixel up to past the byte.
+                for (int32_t span = 1; span <= per + 1; ++span) {
+                    for (int32_t base : {0, 8, 4096, 8192 - 2 * per}) {
+                        const HVT_Box b{base + left, rows[0], base + left + span, rows[1]};
+                        BoxBuffer buf(b, d, rng);
+                        const Expected e = ModelShiftRead(m, b, buf, tb, f.Info(), 0);
+                        ASSERT_EQ(HVT_ReadBlockWithBitShift(0, f.Info(), &b, static_cast<int32_t>(buf.stride),
+                                                            buf.bytes.data()),
+                                  TS_OK);
+                        ExpectBuffer(e, buf, "shifted read", b);
+                        ++cases;
+                    }
+                }
+                // Across the tile edge: the second column starts at destination
+                // phase (8192 - left) * d mod 8 and its span is 1 to 5 pixels.
+                for (int32_t tail = 1; tail <= 5; ++tail) {
+                    const HVT_Box b{8192 - left, rows[0], 8192 + tail, rows[1]};
+                    BoxBuffer buf(b, d, rng);
+                    const Expected e = ModelShiftRead(m, b, buf, tb, f.Info(), 0);
+                    ASSERT_EQ(HVT_ReadBlockWithBitShift(0, f.Info(), &b, static_cast<int32_t>(buf.stride),
+                                                        buf.bytes.data()),
+                              TS_OK);
+                    ExpectBuffer(e, buf, "shifted read across tiles", b);
+                    ++cases;
+                }
+                if (HasFailure()) return;
+            }
+        }
+        EXPECT_GT(cases, 100);
+    }
+}
+
+// A band session's record serves the transfers too: its band reads go
+// straight into the band buffer, and tileBuffer still holds what their walks
+// leave in it when a shifted read looks, after bands of the same height and
+// after a shorter last band.
+TEST_F(ShiftedRead, AfterTheBandReadsOfASession) {
+    for (int32_t d : {1, 4}) {
+        const int32_t w = 8200, h = 40;
+        BI_Bitmap *b = nullptr;
+        ASSERT_EQ(BI_CreateBlankBmp(2, static_cast<uint8_t>(d), w, h, 300, 300, 1, 0, nullptr, &b, 2, 0, 0, 0),
+                  TS_OK);
+        Model m(w, h, d);
+        std::mt19937 rng(40 + d);
+        for (auto &v : m.bytes) v = static_cast<uint8_t>(rng());
+        {
+            HVT_FileInfo info;
+            HVT_InitFileInfo(&info);
+            ASSERT_EQ(HVT_TileFileBegin(b, &info, 0), TS_OK);
+            const HVT_Box all{0, 0, w, h};
+            ASSERT_EQ(HVT_SaveBlock(0, &info, &all, static_cast<int32_t>(m.rowBytes), m.bytes.data()), TS_OK);
+            HVT_TileFileEnd(&info, 0);
+        }
+        const int32_t bandRowBytes = w * d / 8 + 1;
+        ASSERT_EQ(HVT_TileFileRowIOBegin(1, b, nullptr, 2, 0, bandRowBytes * 16), TS_OK);
+        HVT_FileInfo *s = b->ioSession;
+        ASSERT_EQ(s->bandRows, 16);
+        TileBufferModel tb(b->tilePath, d);
+        std::memset(s->tileBuffer, 0, tb.bytes.size());
+        auto shifted = [&](const HVT_Box &box) {
+            BoxBuffer buf(box, d, rng);
+            const Expected e = ModelShiftRead(m, box, buf, tb, s, 0);
+            ASSERT_EQ(HVT_ReadBlockWithBitShift(0, s, &box, static_cast<int32_t>(buf.stride), buf.bytes.data()),
+                      TS_OK);
+            ExpectBuffer(e, buf, "shifted read on the session's record", box);
+        };
+        uint8_t v = 0;
+        ASSERT_EQ(BI_GetGRow(b, 3, 0, 1, &v), TS_OK);
+        tb.Walk(s, 0, {0, 0, w, 16}, d);
+        shifted({8189, 20, 8192, 22});
+        ASSERT_EQ(BI_GetGRow(b, 3, 0, 1, &v), TS_OK);   // a new band read
+        tb.Walk(s, 0, {0, 0, w, 16}, d);
+        ASSERT_EQ(BI_GetGRow(b, 20, 0, 1, &v), TS_OK);  // the same height
+        tb.Walk(s, 0, {0, 16, w, 32}, d);
+        ASSERT_EQ(BI_GetGRow(b, 35, 0, 1, &v), TS_OK);  // shorter: 8 rows
+        tb.Walk(s, 0, {0, 32, w, 40}, d);
+        shifted({8189, 0, 8192, 9});
+        shifted({8197, 1, 8199, 3});
+        HVT_TileFileRowColIOEnd(b);
+        BI_DeleteBitmap(&b);
     }
 }
 
