@@ -1,4 +1,4 @@
-# Tessarine: `make demo` runs the demo, `make test` builds and passes every
+# Tessarine: `make demo` runs the main job (the command-line tool on the samples), `make test` builds and passes every
 # test (then again under AddressSanitizer + UndefinedBehaviorSanitizer, with a
 # short run of every fuzz target), `make bench` runs the benchmarks.
 # Each target installs missing Debian packages first.
@@ -9,7 +9,7 @@ BENCH_BUILD ?= build-bench
 JOBS ?= $(shell nproc)
 FUZZ_SECONDS ?= 300
 
-.PHONY: all deps build demo test test-plain test-san fuzz bench install clean
+.PHONY: all deps build demo tour test test-plain test-san fuzz bench install clean
 
 all: build
 
@@ -20,7 +20,12 @@ build: deps
 	cmake -S . -B $(BUILD) -DCMAKE_BUILD_TYPE=RelWithDebInfo
 	cmake --build $(BUILD) -j $(JOBS)
 
+# The main job: the command-line tool on the samples, outputs in out/.
 demo: build
+	tools/demo-job.sh $(BUILD)/tools/cli/tessarine out
+
+# The API tour: an example program calling the library directly.
+tour: build
 	$(BUILD)/tools/tessarine_demo
 
 test: test-plain test-san

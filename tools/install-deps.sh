@@ -3,7 +3,8 @@
 # benchmarks need, when any is missing. Needs root (or sudo) only then.
 set -eu
 packages="cmake make g++ clang libclang-rt-14-dev pkg-config binutils libgtest-dev
-libbenchmark-dev liblcms2-dev libgs-common libvips-tools libcairo2-dev"
+libbenchmark-dev liblcms2-dev libgs-common libvips-tools libcairo2-dev libcli11-dev
+libpng-dev libtiff-dev libxml2-dev nlohmann-json3-dev"
 missing=""
 for p in $packages; do
   if ! dpkg-query -W -f='${Status}' "$p" 2>/dev/null | grep -q 'install ok installed'; then
