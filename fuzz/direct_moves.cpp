@@ -8,14 +8,11 @@
 
 #include <tessarine/tessarine.h>
 
+#include "fuzz_input.h"
+
 namespace {
 
-struct Reader {
-    const uint8_t *p;
-    size_t n;
-    uint8_t U8() { return n ? (--n, *p++) : 0; }
-    int32_t I16() { return static_cast<int16_t>(U8() | U8() << 8); }
-};
+using Reader = ByteReader;
 
 struct LayoutChoice {
     uint8_t type, d, model;

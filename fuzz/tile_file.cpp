@@ -11,23 +11,12 @@
 #include <string>
 #include <vector>
 
+#include "fuzz_input.h"
 #include <tessarine/storage.h>
 
 namespace {
 
-// The input lives in a file only while one input runs.
-const std::string &InputPath() {
-    static const std::string path = [] {
-        const char *dir = std::getenv("TMPDIR");
-        std::string p = std::string(dir && *dir ? dir : "/tmp") + "/tile-fuzz-XXXXXX";
-        const int fd = ::mkstemp(p.data());
-        if (fd < 0) std::abort();
-        ::close(fd);
-        ::unlink(p.c_str());
-        return p;
-    }();
-    return path;
-}
+const std::string &InputPath() { return ScratchInputPath("tile-fuzz"); }
 
 void WriteInput(const uint8_t *data, size_t size) {
     const int fd = ::open(InputPath().c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);

@@ -10,22 +10,12 @@
 #include <sstream>
 #include <string>
 
+#include "fuzz_input.h"
 #include "commands.h"
 
 namespace {
 
-const std::string &InputPath() {
-    static const std::string path = [] {
-        const char *dir = std::getenv("TMPDIR");
-        std::string p = std::string(dir && *dir ? dir : "/tmp") + "/info-fuzz-XXXXXX";
-        const int fd = ::mkstemp(p.data());
-        if (fd < 0) std::abort();
-        ::close(fd);
-        ::unlink(p.c_str());
-        return p;
-    }();
-    return path;
-}
+const std::string &InputPath() { return ScratchInputPath("info-fuzz"); }
 
 }  // namespace
 
