@@ -99,7 +99,7 @@ void RunExport(const ExportOptions &options, std::ostream &out) {
     // A colour match costs a transform each call: rows go to it in batches.
     const bool batched = b->imageType == 4 && cmyk && !options.tiffCmyk && toRgb.UsesProfiles();
     const size_t batchRows = batched ? std::max<size_t>(1, (size_t(4) << 20) / (w * 4)) : 1;
-    std::vector<uint8_t> row(RowBytes(f) + 8), bytes(w * 4 + 16), interleaved(w * 4 * batchRows);
+    std::vector<uint8_t> bytes(w * 4 + 16), interleaved(w * 4 * batchRows);
     std::vector<uint8_t> batchRgb(batched ? w * 3 * batchRows : 0);
     size_t batchedRows = 0;
     auto flushBatch = [&] {
@@ -113,12 +113,13 @@ void RunExport(const ExportOptions &options, std::ostream &out) {
         const int32_t n = f.width;
         for (int32_t y = 0; y < f.height; ++y) {
             const std::string doing = "read row " + std::to_string(y);
+            uint8_t *row = writer->NextSlot(); // the row is built in the writer's ring
             if (b->imageType == 4 && b->colorModel == 1) {
-                Check(BI_GetRGBRowInterlace(b, y, 0, n, row.data()), options.input, doing);
+                Check(BI_GetRGBRowInterlace(b, y, 0, n, row), options.input, doing);
             } else if (b->imageType == 4) {
                 uint8_t *c = bytes.data(), *m = c + w, *ye = m + w, *k = ye + w;
                 Check(BI_GetCMYKRow(b, y, 0, n, c, m, ye, k), options.input, doing);
-                uint8_t *target = options.tiffCmyk ? row.data() : interleaved.data() + batchedRows * w * 4;
+                uint8_t *target = options.tiffCmyk ? row : interleaved.data() + batchedRows * w * 4;
                 for (size_t x = 0; x < w; ++x) {
                     target[4 * x] = c[x];
                     target[4 * x + 1] = m[x];
@@ -129,11 +130,11 @@ void RunExport(const ExportOptions &options, std::ostream &out) {
                     if (++batchedRows == batchRows) flushBatch();
                     continue;
                 }
-                if (!options.tiffCmyk) toRgb.Convert(target, row.data(), n);
+                if (!options.tiffCmyk) toRgb.Convert(target, row, n);
             } else if (b->imageType == 3) {
                 Check(BI_GetIndexRow(b, y, 0, n, bytes.data()), options.input, doing);
                 if (indexTable.empty()) {
-                    std::memcpy(row.data(), bytes.data(), w);
+                    std::memcpy(row, bytes.data(), w);
                 } else {
                     const size_t entries = indexTable.size() / 3;
                     for (size_t x = 0; x < w; ++x) {
@@ -142,19 +143,19 @@ void RunExport(const ExportOptions &options, std::ostream &out) {
                     }
                 }
             } else if (b->bitsPerPixel == 1) {
-                Check(BI_GetBWPackedRow(b, y, 0, n, row.data()), options.input, doing);
+                Check(BI_GetBWPackedRow(b, y, 0, n, row), options.input, doing);
                 if (w % 8) row[w / 8] &= uint8_t(0xFF00 >> (w % 8));
             } else {
                 Check(BI_GetGRow(b, y, 0, n, bytes.data()), options.input, doing);
                 if (b->bitsPerPixel == 8) {
                     for (size_t x = 0; x < w; ++x) row[x] = uint8_t(255 - bytes[x]);
                 } else {
-                    std::memset(row.data(), 0, (w + 1) / 2);
+                    std::memset(row, 0, (w + 1) / 2);
                     for (size_t x = 0; x < w; ++x)
                         row[x / 2] |= uint8_t((15 - bytes[x] / 17) << (x & 1 ? 0 : 4));
                 }
             }
-            writer->WriteRow(row.data());
+            writer->WriteRow(row);
         }
         flushBatch();
         session.End();

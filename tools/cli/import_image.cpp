@@ -201,11 +201,8 @@ void RunImport(const ImportOptions &options, std::ostream &out) {
     {
         RowSession session(image.Bitmap(), 2, 0, options.output);
         RowImporter importer(image.Bitmap(), f, options.output);
-        std::vector<uint8_t> row(RowBytes(f) + 8);
-        for (int32_t y = 0; y < f.height; ++y) {
-            reader->ReadRow(row.data());
-            importer.Write(y, row.data());
-        }
+        // Each row goes from the reader's ring straight to the library.
+        for (int32_t y = 0; y < f.height; ++y) importer.Write(y, reader->NextRow());
         session.End();
     }
     image.Commit();

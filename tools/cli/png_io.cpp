@@ -58,6 +58,10 @@ class PngReader final : public RasterReader {
         const uint8_t *source;
         if (interlaced_) {
             source = rows_[size_t(next_++)];
+        } else if (!alpha_ && rowBytes_ == RowBytes(format_)) {
+            // Rows as they come out of libpng: decoded where they are wanted.
+            if (!ReadOne(row)) Fail(error_.message);
+            return;
         } else {
             if (!ReadOne(raw_.data())) Fail(error_.message);
             source = raw_.data();
