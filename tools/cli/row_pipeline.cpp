@@ -4,10 +4,10 @@
 #include <condition_variable>
 #include <cstring>
 #include <exception>
+#include <memory>
 #include <mutex>
 #include <stdexcept>
 #include <thread>
-#include <vector>
 
 namespace tessarine::cli {
 namespace {
@@ -25,7 +25,7 @@ class RowRing {
   public:
     explicit RowRing(size_t rowBytes)
         : rowBytes_(rowBytes), slots_(std::clamp(kRingBytes / std::max<size_t>(rowBytes, 1), kMinSlots, kMaxSlots)),
-          batch_(slots_ / 4), rows_(rowBytes_ * slots_) {}
+          batch_(slots_ / 4), rows_(std::make_unique_for_overwrite<uint8_t[]>(rowBytes_ * slots_)) {}
 
     // Producer: the next empty row, or null once the ring is stopped.
     uint8_t *Empty() {
@@ -83,10 +83,10 @@ class RowRing {
     size_t RowBytes() const { return rowBytes_; }
 
   private:
-    uint8_t *Slot(size_t i) { return rows_.data() + i * rowBytes_; }
+    uint8_t *Slot(size_t i) { return rows_.get() + i * rowBytes_; }
 
     const size_t rowBytes_, slots_, batch_;
-    std::vector<uint8_t> rows_;
+    std::unique_ptr<uint8_t[]> rows_; // left unset: every row is written before it is read
     std::mutex mutex_;
     std::condition_variable filled_, space_;
     size_t head_ = 0, full_ = 0;
