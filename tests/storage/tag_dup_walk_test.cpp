@@ -185,6 +185,97 @@ TEST_F(DupWalkTest, StepIntoAPassedBlockGoesOnToTheEndPosition) {
               Model(kP, {TagAt(source, {1, 0}), TagAt(source, {10, 9}), TagAt(source, {10, 17})}));
 }
 
+// Made by ordinary calls with a cache of four blocks. Every new block goes in
+// after block 1, so block 1 leads to the newest: a long tag at (1, 0), tags up
+// to the end of block 9, and a 20-byte tag alone at (10, 0). After a reopen
+// the first tag is read, which caches block 1 clean. Deleting the tag at
+// (10, 0) frees block 10 and gives block 1 its new next in that clean image
+// only, which the next reopen drops: in the file block 1 still leads to block
+// 10, whose next is now the free link 0.
+class StaleLinkTest : public DupWalkTest {
+  protected:
+    void MakeStaleLink(uint32_t firstLength) {
+        Make(4, kP);
+        ASSERT_EQ(Append(1, firstLength, Pattern(firstLength - 8, 1)), (FM_BlockAddr{1, 0}));
+        Append(2, kP - file_->header.endOffset, Pattern(kP - file_->header.endOffset - 8, 2));
+        ASSERT_EQ(file_->header.endBlock, 0u);  // the first tag's last block is full
+        for (uint8_t kind = 3; file_->header.nextIndex < 10; ++kind)
+            Append(kind, kP, Pattern(kP - 8, kind));
+        const FM_BlockAddr alone = Append(9, 20, Pattern(12, 9));
+        ASSERT_EQ(alone, (FM_BlockAddr{10, 0}));
+        ASSERT_EQ(file_->header.lastBlock, 1u);
+        Reopen(4);
+        FM_TagHdr first{};
+        ASSERT_EQ(StatusOf(FM_TagReadHdr(file_, 1, 0, &first, nullptr, nullptr)), 10);
+        ASSERT_EQ(first.length, firstLength);
+        FM_BlockAddr next{};
+        ASSERT_EQ(StatusOf(FM_TagDelete(file_, &alone, &next)), 10);
+        ASSERT_EQ(next.block, 0u);
+        ASSERT_EQ(file_->header.freeHead, 10u);
+        ASSERT_EQ(file_->header.endBlock, 0u);
+        FM_MemBlock *one = Cached(file_, 1);
+        ASSERT_NE(one, nullptr);
+        ASSERT_EQ(one->dirty, 0u);
+        ASSERT_EQ(ImageWord(one, 0), 9u);
+        Reopen(4);
+    }
+};
+
+// The file as the delete leaves it, chain 1, 10, 0 and no end position: the
+// step of a 150-byte tag at (1, 0) goes through block 10 and the free link 0
+// on to the next that the file's first bytes give. The tag is appended to the
+// copy, whose second piece of data runs off the chain.
+TEST_F(StaleLinkTest, TagThatStepsThroughAFreedBlockIsAppendedAndItsCopyFails) {
+    ASSERT_NO_FATAL_FAILURE(MakeStaleLink(150));
+    ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
+    const std::vector<uint8_t> source = ReadAll(path_);
+    ASSERT_EQ(source.size(), 11u * kS);
+    EXPECT_EQ(Le32(source, 16), 1u);       // firstBlock
+    EXPECT_EQ(Le32(source, 24), 10u);      // freeHead
+    EXPECT_EQ(Le32(source, 28), 0u);       // endBlock
+    EXPECT_EQ(Le32(source, 1 * kS), 10u);  // chain 1, 10, 0
+    EXPECT_EQ(Le32(source, 10 * kS), 0u);
+    EXPECT_EQ(source[kS + 12], 1);  // the tag at (1, 0)
+    EXPECT_EQ(Le32(source, kS + 12 + 4), 150u);
+    // Of its data only the first piece reaches the copy.
+    LiveTag first;
+    first.header = Tag(1, 150);
+    first.data = ChainBytes(source, 1, 8, kP);
+    EXPECT_EQ(Dup(), -4);
+    EXPECT_EQ(ReadAll(path_), source);
+    EXPECT_EQ(ReadAll(Copy()), Model(kP, {first}));
+}
+
+// Three more tags: block 10 comes back from the free list and goes in after
+// block 1, whose next in the file is already 10, so it is linked to itself.
+// Chain 1, 10, 10 and end position (10, 26): the 105-byte tag at (1, 0) steps
+// into block 10 twice and lands on (10, 9), and two live tags lead to the end.
+// The walk passes over the tag at (10, 0).
+TEST_F(StaleLinkTest, StepIntoAPassedBlockOfAFileMadeByTagCalls) {
+    ASSERT_NO_FATAL_FAILURE(MakeStaleLink(105));
+    ASSERT_EQ(Append(10, 9, Pattern(1, 10)), (FM_BlockAddr{10, 0}));
+    const FM_BlockAddr second = Append(11, 8, {});
+    const FM_BlockAddr third = Append(12, 9, Pattern(1, 12));
+    ASSERT_EQ(second, (FM_BlockAddr{10, 9}));
+    ASSERT_EQ(third, (FM_BlockAddr{10, 17}));
+    ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
+    const std::vector<uint8_t> source = ReadAll(path_);
+    ASSERT_EQ(source.size(), 11u * kS);
+    EXPECT_EQ(Le32(source, 12), 11u);      // nextIndex
+    EXPECT_EQ(Le32(source, 16), 1u);       // firstBlock
+    EXPECT_EQ(Le32(source, 24), 0u);       // freeHead
+    EXPECT_EQ(Le32(source, 28), 10u);      // end position
+    EXPECT_EQ(Le32(source, 32), 26u);
+    EXPECT_EQ(Le32(source, 1 * kS), 10u);  // chain 1, 10, 10
+    EXPECT_EQ(Le32(source, 10 * kS), 10u);
+    const LiveTag first = TagAt(source, {1, 0});
+    EXPECT_EQ(first.header.kind, 1);
+    EXPECT_EQ(first.header.length, 105u);
+    EXPECT_EQ(Dup(), 10);
+    EXPECT_EQ(ReadAll(path_), source);
+    EXPECT_EQ(ReadAll(Copy()), Model(kP, {first, TagAt(source, second), TagAt(source, third)}));
+}
+
 // A free tag at (1, 0) five hundred steps long, round the ring of blocks 2
 // and 3 that block 1 leads into: the live tags it lands on are copied.
 TEST_F(DupWalkTest, FreeTagGoingHundredsOfStepsRoundARing) {
