@@ -10,6 +10,7 @@
 
 #include "block_test_support.h"
 #include "core/status.h"
+#include "stale_link_file.h"
 #include "test_support.h"
 
 namespace {
@@ -52,13 +53,7 @@ LiveTag TagAt(const std::vector<uint8_t> &file, FM_BlockAddr at) {
     return t;
 }
 
-std::vector<uint8_t> Pattern(size_t n, uint8_t seed) {
-    std::vector<uint8_t> v(n);
-    for (size_t i = 0; i < n; ++i) v[i] = uint8_t(seed + 7 * i);
-    return v;
-}
-
-class DupWalkTest : public BlockFileFixture {
+class DupWalkTest : public TagFileFixture {
   protected:
     void TearDown() override {
         FM_Delete(Copy().c_str());
@@ -94,19 +89,6 @@ class DupWalkTest : public BlockFileFixture {
         return bytes;
     }
     int32_t Dup() { return StatusOf(FM_DupTagBlockFile(path_.c_str(), Copy().c_str())); }
-    // Appends a live tag and fills its data.
-    FM_BlockAddr Append(uint8_t kind, uint32_t length, const std::vector<uint8_t> &data) {
-        FM_TagHdr t = Tag(kind, length);
-        FM_BlockAddr tag{}, at{};
-        EXPECT_EQ(StatusOf(FM_TagAppendHdrAtEnd(file_, &t, &tag, &at)), 10);
-        EXPECT_EQ(StatusOf(FM_GetNextAddr(file_, tag.block, tag.offset, 8, &at)), 10);
-        if (!data.empty()) {
-            EXPECT_EQ(StatusOf(FM_BlockWrite(file_, at.block, at.offset, int32_t(data.size()),
-                                             data.data(), nullptr)),
-                      10);
-        }
-        return tag;
-    }
     // Closes the file and sets the next link of a block in its bytes.
     std::vector<uint8_t> CloseAndLink(uint32_t block, uint32_t next) {
         EXPECT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
@@ -148,6 +130,7 @@ TEST_F(DupWalkTest, CopyRunningOffALongerChainKeepsWhatWasCopied) {
 // each with its next link and tags (kind, length) at given offsets; the rest
 // of the data is a pattern.
 constexpr uint32_t kP = 48, kS = kP + 12;
+static_assert(kP == kStaleLinkPayload);
 struct LaidTag {
     uint32_t block, offset;
     uint8_t kind;
@@ -185,47 +168,11 @@ TEST_F(DupWalkTest, StepIntoAPassedBlockGoesOnToTheEndPosition) {
               Model(kP, {TagAt(source, {1, 0}), TagAt(source, {10, 9}), TagAt(source, {10, 17})}));
 }
 
-// Made by ordinary calls with a cache of four blocks. Every new block goes in
-// after block 1, so block 1 leads to the newest: a long tag at (1, 0), tags up
-// to the end of block 9, and a 20-byte tag alone at (10, 0). After a reopen
-// the first tag is read, which caches block 1 clean. Deleting the tag at
-// (10, 0) frees block 10 and gives block 1 its new next in that clean image
-// only, which the next reopen drops: in the file block 1 still leads to block
-// 10, whose next is now the free link 0.
-class StaleLinkTest : public DupWalkTest {
-  protected:
-    void MakeStaleLink(uint32_t firstLength) {
-        Make(4, kP);
-        ASSERT_EQ(Append(1, firstLength, Pattern(firstLength - 8, 1)), (FM_BlockAddr{1, 0}));
-        Append(2, kP - file_->header.endOffset, Pattern(kP - file_->header.endOffset - 8, 2));
-        ASSERT_EQ(file_->header.endBlock, 0u);  // the first tag's last block is full
-        for (uint8_t kind = 3; file_->header.nextIndex < 10; ++kind)
-            Append(kind, kP, Pattern(kP - 8, kind));
-        const FM_BlockAddr alone = Append(9, 20, Pattern(12, 9));
-        ASSERT_EQ(alone, (FM_BlockAddr{10, 0}));
-        ASSERT_EQ(file_->header.lastBlock, 1u);
-        Reopen(4);
-        FM_TagHdr first{};
-        ASSERT_EQ(StatusOf(FM_TagReadHdr(file_, 1, 0, &first, nullptr, nullptr)), 10);
-        ASSERT_EQ(first.length, firstLength);
-        FM_BlockAddr next{};
-        ASSERT_EQ(StatusOf(FM_TagDelete(file_, &alone, &next)), 10);
-        ASSERT_EQ(next.block, 0u);
-        ASSERT_EQ(file_->header.freeHead, 10u);
-        ASSERT_EQ(file_->header.endBlock, 0u);
-        FM_MemBlock *one = Cached(file_, 1);
-        ASSERT_NE(one, nullptr);
-        ASSERT_EQ(one->dirty, 0u);
-        ASSERT_EQ(ImageWord(one, 0), 9u);
-        Reopen(4);
-    }
-};
-
-// The file as the delete leaves it, chain 1, 10, 0 and no end position: the
-// step of a 150-byte tag at (1, 0) goes through block 10 and the free link 0
-// on to the next that the file's first bytes give. The tag is appended to the
-// copy, whose second piece of data runs off the chain.
-TEST_F(StaleLinkTest, TagThatStepsThroughAFreedBlockIsAppendedAndItsCopyFails) {
+// A file made by tag calls (MakeStaleLink), chain 1, 10, 0 and no end
+// position: the step of a 150-byte tag at (1, 0) goes through block 10 and
+// the free link 0 on to the next that the file's first bytes give. The tag is
+// appended to the copy, whose second piece of data runs off the chain.
+TEST_F(DupWalkTest, TagThatStepsThroughAFreedBlockIsAppendedAndItsCopyFails) {
     ASSERT_NO_FATAL_FAILURE(MakeStaleLink(150));
     ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
     const std::vector<uint8_t> source = ReadAll(path_);
@@ -246,25 +193,20 @@ TEST_F(StaleLinkTest, TagThatStepsThroughAFreedBlockIsAppendedAndItsCopyFails) {
     EXPECT_EQ(ReadAll(Copy()), Model(kP, {first}));
 }
 
-// Three more tags: block 10 comes back from the free list and goes in after
-// block 1, whose next in the file is already 10, so it is linked to itself.
-// Chain 1, 10, 10 and end position (10, 26): the 105-byte tag at (1, 0) steps
-// into block 10 twice and lands on (10, 9), and two live tags lead to the end.
-// The walk passes over the tag at (10, 0).
-TEST_F(StaleLinkTest, StepIntoAPassedBlockOfAFileMadeByTagCalls) {
+// Then block 10 linked to itself. Chain 1, 10, 10 and end position (10, 26):
+// the 105-byte tag at (1, 0) steps into block 10 twice and lands on (10, 9),
+// and two live tags lead to the end. The walk passes over the tag at (10, 0).
+TEST_F(DupWalkTest, StepIntoAPassedBlockOfAFileMadeByTagCalls) {
     ASSERT_NO_FATAL_FAILURE(MakeStaleLink(105));
-    ASSERT_EQ(Append(10, 9, Pattern(1, 10)), (FM_BlockAddr{10, 0}));
-    const FM_BlockAddr second = Append(11, 8, {});
-    const FM_BlockAddr third = Append(12, 9, Pattern(1, 12));
-    ASSERT_EQ(second, (FM_BlockAddr{10, 9}));
-    ASSERT_EQ(third, (FM_BlockAddr{10, 17}));
+    FM_BlockAddr second{}, third{};
+    ASSERT_NO_FATAL_FAILURE(LinkFreedBlockToItself(&second, &third));
     ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
     const std::vector<uint8_t> source = ReadAll(path_);
     ASSERT_EQ(source.size(), 11u * kS);
-    EXPECT_EQ(Le32(source, 12), 11u);      // nextIndex
-    EXPECT_EQ(Le32(source, 16), 1u);       // firstBlock
-    EXPECT_EQ(Le32(source, 24), 0u);       // freeHead
-    EXPECT_EQ(Le32(source, 28), 10u);      // end position
+    EXPECT_EQ(Le32(source, 12), 11u);  // nextIndex
+    EXPECT_EQ(Le32(source, 16), 1u);   // firstBlock
+    EXPECT_EQ(Le32(source, 24), 0u);   // freeHead
+    EXPECT_EQ(Le32(source, 28), 10u);  // end position
     EXPECT_EQ(Le32(source, 32), 26u);
     EXPECT_EQ(Le32(source, 1 * kS), 10u);  // chain 1, 10, 10
     EXPECT_EQ(Le32(source, 10 * kS), 10u);
