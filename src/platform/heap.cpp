@@ -60,7 +60,7 @@ void *FixedData(FixedHeader *header) { return header + 1; }
 // that cost some 500 times. Only whole 2 MiB stretches inside the block can
 // be backed so; the advice is a hint, and its failure changes nothing.
 constexpr size_t kHugePage = size_t{2} << 20;
-constexpr size_t kHugeAdviceFrom = size_t{32} << 20;
+constexpr size_t kHugeAdviceFrom = size_t{64} << 20;  // above tile and band buffers
 
 void AdviseHugePages(void *block, size_t bytes) {
     if (bytes < kHugeAdviceFrom) return;
