@@ -10,6 +10,7 @@
 #include "block_test_support.h"
 #include "core/status.h"
 #include "platform/test_hooks.h"
+#include "stale_link_file.h"
 #include "test_support.h"
 
 namespace {
@@ -179,6 +180,50 @@ TEST_F(RingWalkTest, ReadFailureAtEachFetchLeavesTheResultHalfWay) {
         EXPECT_EQ(a.block, WalkBytes(bytes, 1, 3, (j - 1) * P).addr.block);
         ASSERT_LT(n, 100);
     }
+}
+
+// Made by tag calls (MakeStaleLink, LinkFreedBlockToItself): block 1 leads
+// into block 10, which is linked to itself, and the end position is (10, 26).
+// Walks from blocks 1 and 10, some running off the end, some hundreds of
+// turns round the ring of one block.
+class StaleLinkWalkTest : public TagFileFixture {};
+
+TEST_F(StaleLinkWalkTest, ChainIntoARingOfOneBlock) {
+    constexpr uint32_t P = kStaleLinkPayload, S = P + 12;
+    ASSERT_NO_FATAL_FAILURE(MakeStaleLink(105));
+    FM_BlockAddr second{}, third{};
+    ASSERT_NO_FATAL_FAILURE(LinkFreedBlockToItself(&second, &third));
+    Reopen(4);
+    const std::vector<uint8_t> bytes = ReadAll(path_);
+    ASSERT_EQ(Le32(bytes, 1 * S), 10u);
+    ASSERT_EQ(Le32(bytes, 10 * S), 10u);
+    for (const FM_BlockAddr from : {FM_BlockAddr{1, 0}, FM_BlockAddr{1, 40}, FM_BlockAddr{10, 9}}) {
+        for (uint32_t distance : {0u, 8u, 48u, 105u, P * 300 + 5, P * 300 + 30, 123457u}) {
+            SCOPED_TRACE(std::to_string(from.block) + "," + std::to_string(from.offset) + " by " +
+                         std::to_string(distance));
+            const Expected e = WalkBytes(bytes, from.block, from.offset, distance);
+            Reopen(4);
+            const int32_t before = Position(file_);
+            FM_BlockAddr a{};
+            ASSERT_EQ(StatusOf(FM_GetNextAddr(file_, from.block, from.offset, distance, &a)), 10);
+            EXPECT_EQ(a, e.addr);
+            EXPECT_EQ(Position(file_), e.lastFetched < 0 ? before : e.lastFetched * S + 12);
+        }
+    }
+}
+
+// Before block 10 comes back (MakeStaleLink alone): chain 1, 10, then the free
+// link 0, whose next is what the file's first four bytes give. A walk reaches
+// that block and stops there; one that goes on fails half-way as it fetches it.
+TEST_F(StaleLinkWalkTest, StepThroughAFreedBlockOutOfTheFileFailsHalfWay) {
+    constexpr uint32_t P = kStaleLinkPayload, distance = 150 + P * 300;
+    ASSERT_NO_FATAL_FAILURE(MakeStaleLink(150));
+    const uint32_t beyond = Le32(ReadAll(path_), 0);
+    FM_BlockAddr a{};
+    ASSERT_EQ(StatusOf(FM_GetNextAddr(file_, 1, 0, 150, &a)), 10);
+    EXPECT_EQ(a, (FM_BlockAddr{beyond, 6}));
+    EXPECT_EQ(StatusOf(FM_GetNextAddr(file_, 1, 0, distance, &a)), -50);
+    EXPECT_EQ(a, (FM_BlockAddr{beyond, distance - 4 * P}));
 }
 
 // Made by ordinary calls: a tag rewritten to 8 bytes in a block that points

@@ -10,6 +10,7 @@
 
 #include "block_test_support.h"
 #include "core/status.h"
+#include "stale_link_file.h"
 #include "test_support.h"
 
 namespace {
@@ -52,13 +53,7 @@ LiveTag TagAt(const std::vector<uint8_t> &file, FM_BlockAddr at) {
     return t;
 }
 
-std::vector<uint8_t> Pattern(size_t n, uint8_t seed) {
-    std::vector<uint8_t> v(n);
-    for (size_t i = 0; i < n; ++i) v[i] = uint8_t(seed + 7 * i);
-    return v;
-}
-
-class DupWalkTest : public BlockFileFixture {
+class DupWalkTest : public TagFileFixture {
   protected:
     void TearDown() override {
         FM_Delete(Copy().c_str());
@@ -94,19 +89,6 @@ class DupWalkTest : public BlockFileFixture {
         return bytes;
     }
     int32_t Dup() { return StatusOf(FM_DupTagBlockFile(path_.c_str(), Copy().c_str())); }
-    // Appends a live tag and fills its data.
-    FM_BlockAddr Append(uint8_t kind, uint32_t length, const std::vector<uint8_t> &data) {
-        FM_TagHdr t = Tag(kind, length);
-        FM_BlockAddr tag{}, at{};
-        EXPECT_EQ(StatusOf(FM_TagAppendHdrAtEnd(file_, &t, &tag, &at)), 10);
-        EXPECT_EQ(StatusOf(FM_GetNextAddr(file_, tag.block, tag.offset, 8, &at)), 10);
-        if (!data.empty()) {
-            EXPECT_EQ(StatusOf(FM_BlockWrite(file_, at.block, at.offset, int32_t(data.size()),
-                                             data.data(), nullptr)),
-                      10);
-        }
-        return tag;
-    }
     // Closes the file and sets the next link of a block in its bytes.
     std::vector<uint8_t> CloseAndLink(uint32_t block, uint32_t next) {
         EXPECT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
@@ -148,6 +130,7 @@ TEST_F(DupWalkTest, CopyRunningOffALongerChainKeepsWhatWasCopied) {
 // each with its next link and tags (kind, length) at given offsets; the rest
 // of the data is a pattern.
 constexpr uint32_t kP = 48, kS = kP + 12;
+static_assert(kP == kStaleLinkPayload);
 struct LaidTag {
     uint32_t block, offset;
     uint8_t kind;
@@ -183,6 +166,56 @@ TEST_F(DupWalkTest, StepIntoAPassedBlockGoesOnToTheEndPosition) {
     EXPECT_EQ(ReadAll(path_), source);
     EXPECT_EQ(ReadAll(Copy()),
               Model(kP, {TagAt(source, {1, 0}), TagAt(source, {10, 9}), TagAt(source, {10, 17})}));
+}
+
+// A file made by tag calls (MakeStaleLink), chain 1, 10, 0 and no end
+// position: the step of a 150-byte tag at (1, 0) goes through block 10 and
+// the free link 0 on to the next that the file's first bytes give. The tag is
+// appended to the copy, whose second piece of data runs off the chain.
+TEST_F(DupWalkTest, TagThatStepsThroughAFreedBlockIsAppendedAndItsCopyFails) {
+    ASSERT_NO_FATAL_FAILURE(MakeStaleLink(150));
+    ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
+    const std::vector<uint8_t> source = ReadAll(path_);
+    ASSERT_EQ(source.size(), 11u * kS);
+    EXPECT_EQ(Le32(source, 16), 1u);       // firstBlock
+    EXPECT_EQ(Le32(source, 24), 10u);      // freeHead
+    EXPECT_EQ(Le32(source, 28), 0u);       // endBlock
+    EXPECT_EQ(Le32(source, 1 * kS), 10u);  // chain 1, 10, 0
+    EXPECT_EQ(Le32(source, 10 * kS), 0u);
+    EXPECT_EQ(source[kS + 12], 1);  // the tag at (1, 0)
+    EXPECT_EQ(Le32(source, kS + 12 + 4), 150u);
+    // Of its data only the first piece reaches the copy.
+    LiveTag first;
+    first.header = Tag(1, 150);
+    first.data = ChainBytes(source, 1, 8, kP);
+    EXPECT_EQ(Dup(), -4);
+    EXPECT_EQ(ReadAll(path_), source);
+    EXPECT_EQ(ReadAll(Copy()), Model(kP, {first}));
+}
+
+// Then block 10 linked to itself. Chain 1, 10, 10 and end position (10, 26):
+// the 105-byte tag at (1, 0) steps into block 10 twice and lands on (10, 9),
+// and two live tags lead to the end. The walk passes over the tag at (10, 0).
+TEST_F(DupWalkTest, StepIntoAPassedBlockOfAFileMadeByTagCalls) {
+    ASSERT_NO_FATAL_FAILURE(MakeStaleLink(105));
+    FM_BlockAddr second{}, third{};
+    ASSERT_NO_FATAL_FAILURE(LinkFreedBlockToItself(&second, &third));
+    ASSERT_EQ(StatusOf(FM_BlockFileClose(&file_)), 10);
+    const std::vector<uint8_t> source = ReadAll(path_);
+    ASSERT_EQ(source.size(), 11u * kS);
+    EXPECT_EQ(Le32(source, 12), 11u);  // nextIndex
+    EXPECT_EQ(Le32(source, 16), 1u);   // firstBlock
+    EXPECT_EQ(Le32(source, 24), 0u);   // freeHead
+    EXPECT_EQ(Le32(source, 28), 10u);  // end position
+    EXPECT_EQ(Le32(source, 32), 26u);
+    EXPECT_EQ(Le32(source, 1 * kS), 10u);  // chain 1, 10, 10
+    EXPECT_EQ(Le32(source, 10 * kS), 10u);
+    const LiveTag first = TagAt(source, {1, 0});
+    EXPECT_EQ(first.header.kind, 1);
+    EXPECT_EQ(first.header.length, 105u);
+    EXPECT_EQ(Dup(), 10);
+    EXPECT_EQ(ReadAll(path_), source);
+    EXPECT_EQ(ReadAll(Copy()), Model(kP, {first, TagAt(source, second), TagAt(source, third)}));
 }
 
 // A free tag at (1, 0) five hundred steps long, round the ring of blocks 2
