@@ -146,7 +146,7 @@ void BM_ImportAndExportPairedWithLibpng(benchmark::State &state) {
     Report("export", exportRatios, exportPeak, encodePeak, 1 / 1.2);
 }
 
-BENCHMARK(BM_ImportAndExportPairedWithLibpng)->Unit(benchmark::kSecond)->UseManualTime()->Iterations(3);
+BENCHMARK(BM_ImportAndExportPairedWithLibpng)->Unit(benchmark::kSecond)->UseManualTime()->Iterations(5);
 
 }  // namespace
 
