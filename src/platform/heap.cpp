@@ -1,9 +1,6 @@
 #include "platform/heap.h"
 
-#include <sys/mman.h>
-
 #include <atomic>
-#include <cstdint>
 #include <cstdlib>
 #include <cstring>
 #include <limits>
@@ -55,27 +52,11 @@ MEM_Handle HandleOf(MoveableRecord *record) {
 
 void *FixedData(FixedHeader *header) { return header + 1; }
 
-// Picture-sized blocks are filled at first touch, a page fault for every
-// 4 KiB; asking for huge pages where the system gives them on request cuts
-// that cost some 500 times. Only whole 2 MiB stretches inside the block can
-// be backed so; the advice is a hint, and its failure changes nothing.
-constexpr size_t kHugePage = size_t{2} << 20;
-constexpr size_t kHugeAdviceFrom = size_t{64} << 20;  // above tile and band buffers
-
-void AdviseHugePages(void *block, size_t bytes) {
-    if (bytes < kHugeAdviceFrom) return;
-    const uintptr_t begin = (reinterpret_cast<uintptr_t>(block) + kHugePage - 1) & ~(kHugePage - 1);
-    const uintptr_t end = (reinterpret_cast<uintptr_t>(block) + bytes) & ~(kHugePage - 1);
-    if (end > begin) (void)::madvise(reinterpret_cast<void *>(begin), end - begin, MADV_HUGEPAGE);
-}
-
 // The one place memory is asked of the C allocator: counted for injection.
 void *Acquire(void *old, size_t bytes) {
     if (bytes > kLargest || injection::TooLarge(bytes) || injection::ShouldFail(injection::kAlloc))
         return nullptr;
-    void *block = std::realloc(old, bytes == 0 ? 1 : bytes);
-    if (block != nullptr) AdviseHugePages(block, bytes);
-    return block;
+    return std::realloc(old, bytes == 0 ? 1 : bytes);
 }
 
 MEM_Handle AllocFixed(uint32_t flags, size_t bytes) {
